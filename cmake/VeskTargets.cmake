@@ -1,0 +1,36 @@
+# Small helpers so that every subsystem declares its library, tests and
+# benchmarks the same way.
+
+# vesk_library(<name> SOURCES <files...> DEPS <targets...>)
+# One static library per subsystem; position-independent so that libVesk.so
+# can link them all.
+function(vesk_library name)
+  cmake_parse_arguments(ARG "" "" "SOURCES;DEPS" ${ARGN})
+  add_library(${name} STATIC ${ARG_SOURCES})
+  target_include_directories(${name} PUBLIC ${VESK_SOURCE_ROOT})
+  target_link_libraries(${name} PUBLIC ${ARG_DEPS})
+endfunction()
+
+# vesk_test(<name> SOURCES <files...> DEPS <targets...> [LABELS <labels...>])
+# A GoogleTest executable whose tests are registered with CTest one by one.
+function(vesk_test name)
+  if(NOT VESK_BUILD_TESTS)
+    return()
+  endif()
+  cmake_parse_arguments(ARG "" "" "SOURCES;DEPS;LABELS" ${ARGN})
+  add_executable(${name} ${ARG_SOURCES})
+  target_link_libraries(${name} PRIVATE ${ARG_DEPS} GTest::gmock GTest::gtest GTest::gtest_main)
+  set(_labels unit ${ARG_LABELS})
+  gtest_discover_tests(${name} DISCOVERY_TIMEOUT 120 PROPERTIES LABELS "${_labels}")
+endfunction()
+
+# vesk_benchmark(<name> SOURCES <files...> DEPS <targets...>)
+# A Google Benchmark program; run by hand or by scripts/bench.sh, never by CTest.
+function(vesk_benchmark name)
+  if(NOT VESK_BUILD_BENCHMARKS)
+    return()
+  endif()
+  cmake_parse_arguments(ARG "" "" "SOURCES;DEPS" ${ARGN})
+  add_executable(${name} ${ARG_SOURCES})
+  target_link_libraries(${name} PRIVATE ${ARG_DEPS} benchmark::benchmark benchmark::benchmark_main)
+endfunction()

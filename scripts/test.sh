@@ -1,0 +1,37 @@
+#!/usr/bin/env bash
+# Builds and runs every test of the project:
+#   host     x86-64: the C++ suites and the JUnit suites through a real JVM;
+#   i686     32-bit x86 (-m32 -march=i686 -mssse3 -mfpmath=sse), the stand-in
+#            for the Android x86 ABI: the C++ suites;
+#   sanitize x86-64 under AddressSanitizer and UndefinedBehaviorSanitizer:
+#            the C++ suites.
+# Installs missing packages first. VESK_TEST_BUILDS="host i686" picks builds.
+set -euo pipefail
+cd "$(dirname "$0")/.."
+./scripts/setup.sh
+
+JOBS=${JOBS:-$(nproc)}
+BUILDS=${VESK_TEST_BUILDS:-host i686 sanitize}
+
+configure_and_build() {
+  local dir=$1
+  shift
+  cmake -S . -B "build/$dir" "$@" > "build/$dir.configure.log" 2>&1 ||
+    { cat "build/$dir.configure.log"; return 1; }
+  cmake --build "build/$dir" -j "$JOBS"
+}
+
+mkdir -p build
+for b in $BUILDS; do
+  echo "=== $b build ==="
+  case $b in
+    host) configure_and_build host ;;
+    i686) configure_and_build i686 -DCMAKE_TOOLCHAIN_FILE=cmake/i686-linux-gnu.cmake \
+            -DVESK_BUILD_JAVA=OFF ;;
+    sanitize) configure_and_build sanitize -DVESK_SANITIZE=ON -DVESK_BUILD_JAVA=OFF \
+                -DVESK_BUILD_BENCHMARKS=OFF ;;
+    *) echo "unknown build: $b" >&2; exit 2 ;;
+  esac
+  (cd "build/$b" && ctest --output-on-failure -j "$JOBS")
+done
+echo "=== all tests passed: $BUILDS ==="
