@@ -1,0 +1,207 @@
+#include "audio/dsp/rational_factor_resampler.h"
+
+#include <algorithm>
+#include <cmath>
+#include <complex>
+#include <cstdint>
+#include <cstring>
+#include <vector>
+
+#include "audio/dsp/number_util.h"
+#include "base/logging.h"
+
+namespace audio_dsp {
+namespace {
+
+// Rate ratios beyond this are rejected before the fraction is formed; the
+// approximation works in 32-bit ints and the tables would be absurd anyway.
+constexpr double kMaxRatio = 65536.0;
+
+// Four-lane float vectors (GCC/Clang vector extension; SSE on x86, NEON on
+// ARM, plain scalar code elsewhere).
+typedef float Float4 __attribute__((vector_size(16)));
+
+inline Float4 Load4(const float* p) {
+  Float4 v;
+  std::memcpy(&v, p, sizeof(v));  // unaligned load
+  return v;
+}
+
+// Sum of a[m] * b[m] over m < n in single precision, as eight partial sums
+// held in two four-lane accumulators, returned lane by lane (lanes 4 to 7 are
+// folded into 0 to 3). The independent accumulators break the dependency
+// chain of a single sum so that the additions pipeline. Ends with a single
+// four-wide step when at least four products remain; the last n mod 4
+// products are left to the caller, which knows how they pair with lanes.
+inline Float4 PartialSums(const float* a, const float* b, int n) {
+  Float4 acc0 = {0.0f, 0.0f, 0.0f, 0.0f};
+  Float4 acc1 = acc0;
+  int m = 0;
+  for (; m + 8 <= n; m += 8) {
+    acc0 += Load4(a + m) * Load4(b + m);
+    acc1 += Load4(a + m + 4) * Load4(b + m + 4);
+  }
+  if (m + 4 <= n) acc1 += Load4(a + m) * Load4(b + m);
+  return acc0 + acc1;
+}
+
+// Real samples: one float per tap.
+inline float Dot(const float* taps, const float* x, int num_taps) {
+  const Float4 acc = PartialSums(taps, x, num_taps);
+  // Up to three remaining products, independent of each other.
+  const int tail = num_taps & ~3;
+  float rest = 0.0f;
+  switch (num_taps - tail) {
+    case 3:
+      rest = taps[tail] * x[tail] + (taps[tail + 1] * x[tail + 1] + taps[tail + 2] * x[tail + 2]);
+      break;
+    case 2:
+      rest = taps[tail] * x[tail] + taps[tail + 1] * x[tail + 1];
+      break;
+    case 1:
+      rest = taps[tail] * x[tail];
+      break;
+  }
+  return ((acc[0] + acc[2]) + (acc[1] + acc[3])) + rest;
+}
+
+// Complex samples: the taps are stored duplicated (t0, t0, t1, t1, ...) so
+// that the interleaved (real, imaginary) floats of x multiply element by
+// element; even lanes collect the real part, odd lanes the imaginary part.
+inline std::complex<float> Dot(const float* doubled_taps, const std::complex<float>* x,
+                               int num_taps) {
+  const float* xf = reinterpret_cast<const float*>(x);
+  const int n = 2 * num_taps;
+  const Float4 acc = PartialSums(doubled_taps, xf, n);
+  float re = acc[0] + acc[2];
+  float im = acc[1] + acc[3];
+  if (n & 2) {
+    re += doubled_taps[n - 2] * xf[n - 2];
+    im += doubled_taps[n - 1] * xf[n - 1];
+  }
+  return {re, im};
+}
+
+// Floats stored per tap: complex samples use duplicated taps.
+template <typename T>
+constexpr int kFloatsPerTap = 1;
+template <>
+constexpr int kFloatsPerTap<std::complex<float>> = 2;
+
+}  // namespace
+
+template <typename T>
+RationalFactorResampler<T>::RationalFactorResampler(const ResamplingKernel& kernel,
+                                                    int max_denominator) {
+  if (max_denominator < 1 || !kernel.Valid()) return;
+  const double ratio = kernel.input_sample_rate() / kernel.output_sample_rate();
+  if (!(ratio < kMaxRatio) || !(kernel.radius() < kMaxRatio)) return;
+  const std::pair<int, int> fraction = RationalApproximation(ratio, max_denominator);
+  numerator_ = fraction.first;
+  denominator_ = fraction.second;
+  if (numerator_ < 1) return;
+  step_ = numerator_ / denominator_;
+  phase_increment_ = numerator_ % denominator_;
+  radius_ = static_cast<int>(std::ceil(kernel.radius()));
+  num_taps_ = 2 * radius_ + 1;
+  // A step longer than a window would skip input that no window covers; the
+  // buffering below relies on every call ending inside the stream.
+  if (step_ > num_taps_ - 1) return;
+
+  constexpr int kCopies = kFloatsPerTap<T>;
+  filters_.resize(static_cast<size_t>(denominator_) * num_taps_ * kCopies);
+  float* tap = filters_.data();
+  for (int j = 0; j < denominator_; ++j) {
+    const double phase_offset = static_cast<double>(j) / denominator_;
+    for (int m = 0; m < num_taps_; ++m) {
+      const float value = static_cast<float>(kernel.Eval((radius_ - m) + phase_offset));
+      for (int c = 0; c < kCopies; ++c) *tap++ = value;
+    }
+  }
+  buffer_.reserve(2 * num_taps_);
+  flush_zeros_.assign(2 * radius_, T(0));
+  valid_ = true;
+  Reset();
+}
+
+template <typename T>
+void RationalFactorResampler<T>::Reset() {
+  phase_ = 0;
+  buffer_.assign(radius_, T(0));
+}
+
+template <typename T>
+void RationalFactorResampler<T>::ProcessSamples(const std::vector<T>& input,
+                                                std::vector<T>* output) {
+  CHECK(output);
+  if (!valid_) {
+    output->clear();
+    return;
+  }
+  // The old samples followed by the new ones form one virtual stream; window
+  // starts run over [0, num_windows).
+  const int64_t num_input = static_cast<int64_t>(input.size());
+  const int64_t num_buffered = static_cast<int64_t>(buffer_.size());
+  const int64_t num_windows = num_buffered + num_input + 1 - num_taps_;
+  if (num_windows <= 0) {
+    output->clear();
+    buffer_.insert(buffer_.end(), input.begin(), input.end());
+    return;
+  }
+  // Window k starts at (phase_ + k p) / q; count those below num_windows.
+  const int64_t count =
+      (static_cast<int64_t>(denominator_) * num_windows - phase_ - 1 + numerator_) / numerator_;
+  output->resize(static_cast<size_t>(count));
+  T* out = output->data();
+
+  // Bridge: windows that start in the buffer reach at most num_taps_ - 1
+  // samples into the input.
+  const int64_t num_bridged = std::min<int64_t>(num_input, num_taps_ - 1);
+  buffer_.insert(buffer_.end(), input.begin(), input.begin() + num_bridged);
+
+  const float* filters = filters_.data();
+  const int num_taps = num_taps_;
+  const size_t filter_stride = static_cast<size_t>(num_taps) * kFloatsPerTap<T>;
+  int phase = phase_;
+  int64_t s = 0;
+  int64_t k = 0;
+  for (; k < count && s < num_buffered; ++k) {
+    out[k] = Dot(filters + phase * filter_stride, buffer_.data() + s, num_taps);
+    s += step_;
+    phase += phase_increment_;
+    if (phase >= denominator_) {
+      phase -= denominator_;
+      ++s;
+    }
+  }
+  for (; k < count; ++k) {
+    out[k] = Dot(filters + phase * filter_stride, input.data() + (s - num_buffered), num_taps);
+    s += step_;
+    phase += phase_increment_;
+    if (phase >= denominator_) {
+      phase -= denominator_;
+      ++s;
+    }
+  }
+  phase_ = phase;
+
+  if (s < num_buffered) {
+    // The windows ran out inside the old samples; then the whole input was
+    // short enough to be bridged, and the buffer already ends with it.
+    buffer_.erase(buffer_.begin(), buffer_.begin() + s);
+  } else {
+    buffer_.assign(input.begin() + (s - num_buffered), input.end());
+  }
+}
+
+template <typename T>
+void RationalFactorResampler<T>::Flush(std::vector<T>* output) {
+  CHECK(output);
+  output->clear();
+  ProcessSamples(flush_zeros_, output);
+}
+
+template class RationalFactorResampler<float>;
+template class RationalFactorResampler<std::complex<float>>;
+
+}  // namespace audio_dsp

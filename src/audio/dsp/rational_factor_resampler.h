@@ -1,0 +1,88 @@
+// Polyphase FIR resampler for a rational rate ratio.
+
+#ifndef AUDIO_DSP_RATIONAL_FACTOR_RESAMPLER_H_
+#define AUDIO_DSP_RATIONAL_FACTOR_RESAMPLER_H_
+
+#include <complex>
+#include <vector>
+
+#include "audio/dsp/resampler.h"
+#include "audio/dsp/resampling_kernel.h"
+
+namespace audio_dsp {
+
+// Converts a stream from kernel.input_sample_rate() to
+// kernel.output_sample_rate(), the ratio input / output being approximated by
+// a fraction p / q with q <= max_denominator. The kernel is tabulated once at
+// construction into q polyphase filters of num_taps() = 2 * radius() + 1 taps
+// (radius() = ceil(kernel.radius()) input samples); each output then costs
+// num_taps() multiply-adds, summed in single precision.
+//
+// Timing: output k is the band-limited input evaluated at input time k * p / q
+// (in input samples, counted from the first sample after construction or
+// Reset()). The filter is centred on that instant, so there is no delay, but
+// the first outputs ramp in (the stream is taken as zero before its start)
+// and an output is produced only once radius() input samples past its instant
+// have arrived; Flush() releases the remaining ones.
+//
+// Blocks may have any size, including 0; the concatenated output does not
+// depend on how the input stream is cut into blocks.
+//
+// Allocation happens at construction; ProcessSamples() allocates only when
+// the output vector has to grow. Instantiated for T = float and
+// T = std::complex<float> (real taps times T). Not thread-safe.
+template <typename T>
+class RationalFactorResampler : public Resampler<T> {
+ public:
+  // `kernel` is read during construction only. The resampler is invalid
+  // (check Valid()) when max_denominator < 1, when the kernel is invalid, or
+  // when the rate ratio is unusable (p / q of 0, a ratio of 2^16 or more, or a
+  // kernel too narrow for the decimation: p / q > 2 * radius()).
+  RationalFactorResampler(const ResamplingKernel& kernel, int max_denominator);
+  RationalFactorResampler(const RationalFactorResampler&) = delete;
+  RationalFactorResampler& operator=(const RationalFactorResampler&) = delete;
+  ~RationalFactorResampler() override = default;
+
+  // Phase 0 and radius() zeros of history.
+  void Reset() override;
+  bool Valid() const override { return valid_; }
+  // Replaces *output with every sample whose window is now complete; keeps at
+  // most num_taps() - 1 input samples for the next call. An invalid resampler
+  // produces nothing.
+  void ProcessSamples(const std::vector<T>& input, std::vector<T>* output) override;
+  // Processes 2 * radius() zeros: *output receives the samples held back at
+  // the end of the stream (instants up to radius() samples past its last
+  // input sample). The state is then as after processing those zeros.
+  void Flush(std::vector<T>* output) override;
+
+  int numerator() const { return numerator_; }      // p, input samples per q outputs
+  int denominator() const { return denominator_; }  // q, number of filter phases
+  int radius() const { return radius_; }            // input samples
+  int num_taps() const { return num_taps_; }
+
+ private:
+  bool valid_ = false;
+  int numerator_ = 0;
+  int denominator_ = 0;
+  int step_ = 0;             // p / q
+  int phase_increment_ = 0;  // p mod q
+  int radius_ = 0;
+  int num_taps_ = 0;
+  // q filters of num_taps_ taps, phase after phase; for complex T every tap
+  // is stored twice in a row to match the interleaved samples.
+  std::vector<float> filters_;
+  // Unconsumed input (at most num_taps_ - 1 samples between calls). During a
+  // call the start of the new input is appended so that the windows that
+  // straddle the old and the new samples read contiguous memory; capacity for
+  // both is reserved at construction.
+  std::vector<T> buffer_;
+  int phase_ = 0;  // 0 to q - 1
+  std::vector<T> flush_zeros_;
+};
+
+extern template class RationalFactorResampler<float>;
+extern template class RationalFactorResampler<std::complex<float>>;
+
+}  // namespace audio_dsp
+
+#endif  // AUDIO_DSP_RATIONAL_FACTOR_RESAMPLER_H_
