@@ -1,0 +1,73 @@
+// Gamma filter: a cascade of identical one-pole low-pass stages. Its impulse
+// response is a gamma-shaped bump whose width and delay grow with the decay
+// and the number of stages; used to smooth envelopes and noise estimates.
+//
+// Each stage computes y[n] = y[n - 1] + (1 - a) * (x[n] - y[n - 1]), so a
+// constant input passes at unit gain. State is carried between Step calls.
+// Thread-compatible: one filter per thread, or external locking.
+
+#ifndef AUDIO_DSP_GAMMA_FILTER_H_
+#define AUDIO_DSP_GAMMA_FILTER_H_
+
+#include <cmath>
+#include <vector>
+
+#include "base/logging.h"
+
+namespace audio_dsp {
+
+class GammaFilter {
+ public:
+  // sample_rate: Hz, > 0; kept only so that callers can express times.
+  // order: number of stages, >= 1. decay: the pole a of every stage, [0, 1).
+  // A non-positive sample rate or an order below 1 is fatal.
+  GammaFilter(double sample_rate, int order, double decay)
+      : sample_rate_(sample_rate), order_(order), decay_(decay), gain_(1.0 - decay) {
+    CHECK(sample_rate > 0.0);
+    CHECK(order >= 1);
+    state_.assign(order, 0.0f);
+  }
+
+  // Feeds one sample and returns the output of the last stage.
+  float Step(float x) {
+    float in = x;
+    for (float& stage : state_) {
+      stage = static_cast<float>((static_cast<double>(in) - stage) * gain_ + stage);
+      in = stage;
+    }
+    return in;
+  }
+
+  // Group delay in samples: the mean of the impulse response,
+  // order * a / (1 - a), rounded half away from zero.
+  int Delay() const { return static_cast<int>(std::lround(order_ * decay_ / (1.0 - decay_))); }
+
+  double decay() const { return decay_; }
+  int order() const { return order_; }
+  double sample_rate() const { return sample_rate_; }
+
+  // Clears the state of every stage, as after construction.
+  void Reset() { state_.assign(state_.size(), 0.0f); }
+
+ private:
+  double sample_rate_;
+  int order_;
+  double decay_;
+  double gain_;
+  std::vector<float> state_;  // One value per stage.
+};
+
+// A GammaFilter whose impulse response has the standard deviation `stddev`
+// (in samples). The response of n stages of decay a has variance
+// n * a / (1 - a)^2; with v = stddev^2 / n this gives
+// a = (1 - sqrt(4v + 1)) / (2v) + 1. A stddev of 0 gives a = 0 (the limit),
+// a filter that passes its input unchanged.
+inline GammaFilter GammaFilterFromStddev(double sample_rate, int order, double stddev) {
+  const double v = stddev * stddev / order;
+  const double decay = v > 0.0 ? (1.0 - std::sqrt(4.0 * v + 1.0)) / (2.0 * v) + 1.0 : 0.0;
+  return GammaFilter(sample_rate, order, decay);
+}
+
+}  // namespace audio_dsp
+
+#endif  // AUDIO_DSP_GAMMA_FILTER_H_

@@ -1,0 +1,36 @@
+#include "audio/dsp/gamma_filter.h"
+
+#include <cmath>
+
+#include "gtest/gtest.h"
+
+namespace audio_dsp {
+namespace {
+
+TEST(GammaFilterTest, FromStddevKnownValues) {
+  const GammaFilter filter = GammaFilterFromStddev(8000.0, 1, 2.0);
+  EXPECT_NEAR(filter.decay(), 0.6096118, 1e-6);    // (1 - sqrt 17) / 8 + 1.
+  EXPECT_EQ(filter.Delay(), 2);                    // round(1.5616)
+  EXPECT_EQ(GammaFilter(1.0, 2, 0.2).Delay(), 1);  // 0.5 rounds away from zero.
+  EXPECT_DEATH(GammaFilter(0.0, 1, 0.5), "Check failed: sample_rate > 0\\.0");
+  EXPECT_DEATH(GammaFilter(1.0, 0, 0.5), "Check failed: order >= 1");
+}
+
+TEST(GammaFilterTest, ImpulseResponseHasUnitGainAndRequestedWidth) {
+  GammaFilter filter = GammaFilterFromStddev(16000.0, 3, 5.0);
+  double sum = 0, mean = 0, second = 0;
+  for (int n = 0; n < 2000; ++n) {
+    const double y = filter.Step(n == 0 ? 1.0f : 0.0f);
+    sum += y;
+    mean += n * y;
+    second += n * n * y;
+  }
+  EXPECT_NEAR(sum, 1.0, 1e-4);  // Unit DC gain.
+  EXPECT_NEAR(second - mean * mean, 25.0, 1e-2);
+  EXPECT_EQ(filter.Delay(), std::lround(mean));
+  filter.Reset();
+  EXPECT_NEAR(filter.Step(1.0f), std::pow(1.0 - filter.decay(), 3), 1e-6);
+}
+
+}  // namespace
+}  // namespace audio_dsp

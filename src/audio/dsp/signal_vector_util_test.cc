@@ -1,0 +1,55 @@
+#include "audio/dsp/signal_vector_util.h"
+
+#include <algorithm>
+#include <complex>
+#include <random>
+#include <vector>
+
+#include "gmock/gmock.h"
+#include "gtest/gtest.h"
+
+namespace audio_dsp {
+namespace {
+
+using ::testing::ElementsAre;
+using Complex = std::complex<float>;
+
+TEST(StreamingFirFilterTest, CarriesStateAcrossCalls) {
+  StreamingFirFilter filter({1, 1});
+  std::vector<Complex> y;
+  filter.ProcessSamples({1, 2}, &y);
+  EXPECT_THAT(y, ElementsAre(Complex(1), Complex(3)));
+  filter.ProcessSamples({3}, &y);
+  EXPECT_THAT(y, ElementsAre(Complex(5)));
+  filter.Reset();
+  filter.ProcessSamples({3}, &y);
+  EXPECT_THAT(y, ElementsAre(Complex(3)));
+  EXPECT_DEATH(filter.ProcessSamples({1}, nullptr), "Check failed: result");
+  EXPECT_DEATH(StreamingFirFilter({}), "Check failed: !impulse_response_\\.empty\\(\\)");
+}
+
+TEST(StreamingFirFilterTest, MatchesConvolutionWhateverTheBlockSplit) {
+  std::mt19937 rng(5);
+  std::uniform_real_distribution<float> value(-1.0f, 1.0f);
+  std::vector<Complex> x(200), taps(17);
+  for (Complex& c : x) c = {value(rng), value(rng)};
+  for (Complex& c : taps) c = {value(rng), value(rng)};
+  for (size_t num_taps : {1, 2, 3, 17}) {
+    StreamingFirFilter filter(std::vector<Complex>(taps.begin(), taps.begin() + num_taps));
+    for (size_t block : {1, 7, 200}) {
+      filter.Reset();
+      for (size_t start = 0; start < x.size(); start += block) {
+        std::vector<Complex> y(x.begin() + start, x.begin() + std::min(x.size(), start + block));
+        filter.ProcessSamples(y, &y);  // In place.
+        for (size_t i = 0, n = start; i < y.size(); ++i, ++n) {
+          Complex expected = 0;
+          for (size_t k = 0; k < num_taps && k <= n; ++k) expected += taps[k] * x[n - k];
+          ASSERT_LT(std::abs(y[i] - expected), 1e-5f) << num_taps << " " << block << " " << n;
+        }
+      }
+    }
+  }
+}
+
+}  // namespace
+}  // namespace audio_dsp
