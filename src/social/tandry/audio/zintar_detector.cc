@@ -254,13 +254,6 @@ void BitReverse(int32_t n, float* data) {
   }
 }
 
-// (re, im) *= (c, s), in place.
-inline void Rotate(float* re, float* im, float c, float s) {
-  const float r = *re * c - *im * s;
-  *im = *re * s + *im * c;
-  *re = r;
-}
-
 // Pairs of length-1 transforms, the radix-2 pass of odd log2 sizes; the same
 // for both directions and both orders.
 void Radix2Pass(int32_t n, float* data) {
@@ -274,45 +267,63 @@ void Radix2Pass(int32_t n, float* data) {
   }
 }
 
+inline void Store4(float* p, Float4 v) { memcpy(p, &v, sizeof(v)); }
+
+// (re0, im0, re1, im1) -> (im0, re0, im1, re1).
+inline Float4 SwapPairs(Float4 v) { return Float4{v[1], v[0], v[3], v[2]}; }
+
+// Multiplies two complex values by w[0] and w[`offset`] of the twiddle table,
+// conjugated when `sin_sign` is -1.
+inline Float4 RotatePair(Float4 v, const float* w, int32_t offset, float sin_sign) {
+  const float s0 = sin_sign * w[1], s1 = sin_sign * w[offset + 1];
+  const Float4 c = {w[0], w[0], w[offset], w[offset]};
+  const Float4 s = {-s0, s0, -s1, s1};
+  return v * c + SwapPairs(v) * s;
+}
+
 // Forward transform, exp(-i theta): natural order in, bit-reversed order out.
-// The twiddle table holds exp(+i theta), so its sines enter negated.
+// Spans of 4L values hold quarters q0 ... q3 of L values each; value k of the
+// quarters feeds one butterfly. Two butterflies run side by side in Float4
+// registers, except in the pass with L = 1, which needs no twiddles.
 void ForwardToBitReversed(const ZintarFftPlan* plan, float* data) {
   const int32_t n = plan->size;
   const float* tw = plan->twiddles;
-  const int32_t min_len = plan->odd_log2 ? 2 : 1;
-  for (int32_t len = n / 4; len >= min_len; len /= 4) {
-    const int32_t stride = n / (4 * len);
+  const Float4 minus_i = {1.0f, -1.0f, 1.0f, -1.0f};  // SwapPairs(v) * minus_i = -i v.
+  int32_t len = n / 4;
+  for (; len >= 2; len /= 4) {
+    const int32_t stride = n / (4 * len);  // Table entries per value of k.
     for (int32_t base = 0; base < n; base += 4 * len) {
       float* q0 = data + 2 * base;
       float* q1 = q0 + 2 * len;
       float* q2 = q1 + 2 * len;
       float* q3 = q2 + 2 * len;
-      for (int32_t k = 0; k < 2 * len; k += 2) {  // k counts floats: value k / 2.
-        const float s02r = q0[k] + q2[k], s02i = q0[k + 1] + q2[k + 1];
-        const float d02r = q0[k] - q2[k], d02i = q0[k + 1] - q2[k + 1];
-        const float s13r = q1[k] + q3[k], s13i = q1[k + 1] + q3[k + 1];
-        const float d13r = q1[k] - q3[k], d13i = q1[k + 1] - q3[k + 1];
-        float y0r = s02r + s13r, y0i = s02i + s13i;
-        float y2r = s02r - s13r, y2i = s02i - s13i;
-        float y1r = d02r + d13i, y1i = d02i - d13r;  // d02 - i d13.
-        float y3r = d02r - d13i, y3i = d02i + d13r;  // d02 + i d13.
-        if (k != 0) {
-          const float* w1 = tw + k * stride;
-          const float* w2 = tw + 2 * k * stride;
-          const float* w3 = tw + 3 * k * stride;
-          Rotate(&y1r, &y1i, w1[0], -w1[1]);
-          Rotate(&y2r, &y2i, w2[0], -w2[1]);
-          Rotate(&y3r, &y3i, w3[0], -w3[1]);
-        }
-        q0[k] = y0r;
-        q0[k + 1] = y0i;
-        q1[k] = y2r;
-        q1[k + 1] = y2i;
-        q2[k] = y1r;
-        q2[k + 1] = y1i;
-        q3[k] = y3r;
-        q3[k + 1] = y3i;
+      for (int32_t k = 0; k < 2 * len; k += 4) {  // k counts floats: values k / 2, k / 2 + 1.
+        const Float4 a0 = Load4(q0 + k), a1 = Load4(q1 + k);
+        const Float4 a2 = Load4(q2 + k), a3 = Load4(q3 + k);
+        const Float4 s02 = a0 + a2, d02 = a0 - a2, s13 = a1 + a3;
+        const Float4 rot = SwapPairs(a1 - a3) * minus_i;
+        const int32_t w = k * stride;  // Float offset of entry (k / 2) * stride.
+        Store4(q0 + k, s02 + s13);
+        Store4(q1 + k, RotatePair(s02 - s13, tw + 2 * w, 4 * stride, -1.0f));  // Phase 2.
+        Store4(q2 + k, RotatePair(d02 + rot, tw + w, 2 * stride, -1.0f));      // Phase 1.
+        Store4(q3 + k, RotatePair(d02 - rot, tw + 3 * w, 6 * stride, -1.0f));  // Phase 3.
       }
+    }
+  }
+  if (len == 1) {
+    for (float* q = data; q < data + 2 * n; q += 8) {
+      const float s02r = q[0] + q[4], s02i = q[1] + q[5];
+      const float d02r = q[0] - q[4], d02i = q[1] - q[5];
+      const float s13r = q[2] + q[6], s13i = q[3] + q[7];
+      const float d13r = q[2] - q[6], d13i = q[3] - q[7];
+      q[0] = s02r + s13r;
+      q[1] = s02i + s13i;
+      q[2] = s02r - s13r;
+      q[3] = s02i - s13i;
+      q[4] = d02r + d13i;  // d02 - i d13.
+      q[5] = d02i - d13r;
+      q[6] = d02r - d13i;  // d02 + i d13.
+      q[7] = d02i + d13r;
     }
   }
   if (plan->odd_log2) Radix2Pass(n, data);
@@ -322,10 +333,27 @@ void ForwardToBitReversed(const ZintarFftPlan* plan, float* data) {
 void InverseFromBitReversed(const ZintarFftPlan* plan, float* data) {
   const int32_t n = plan->size;
   const float* tw = plan->twiddles;
-  int32_t len = 1;  // Length of the transforms already built.
+  const Float4 plus_i = {-1.0f, 1.0f, -1.0f, 1.0f};  // SwapPairs(v) * plus_i = i v.
+  int32_t len = 1;                                   // Length of the transforms already built.
   if (plan->odd_log2) {
     Radix2Pass(n, data);
     len = 2;
+  } else if (n >= 4) {
+    for (float* q = data; q < data + 2 * n; q += 8) {
+      const float s02r = q[0] + q[2], s02i = q[1] + q[3];
+      const float d02r = q[0] - q[2], d02i = q[1] - q[3];
+      const float s13r = q[4] + q[6], s13i = q[5] + q[7];
+      const float d13r = q[4] - q[6], d13i = q[5] - q[7];
+      q[0] = s02r + s13r;
+      q[1] = s02i + s13i;
+      q[4] = s02r - s13r;
+      q[5] = s02i - s13i;
+      q[2] = d02r - d13i;  // d02 + i d13.
+      q[3] = d02i + d13r;
+      q[6] = d02r + d13i;  // d02 - i d13.
+      q[7] = d02i - d13r;
+    }
+    len = 4;
   }
   for (; len < n; len *= 4) {
     const int32_t stride = n / (4 * len);
@@ -334,30 +362,18 @@ void InverseFromBitReversed(const ZintarFftPlan* plan, float* data) {
       float* q1 = q0 + 2 * len;
       float* q2 = q1 + 2 * len;
       float* q3 = q2 + 2 * len;
-      for (int32_t k = 0; k < 2 * len; k += 2) {
-        float t1r = q2[k], t1i = q2[k + 1];  // Phase 1.
-        float t2r = q1[k], t2i = q1[k + 1];  // Phase 2.
-        float t3r = q3[k], t3i = q3[k + 1];
-        if (k != 0) {
-          const float* w1 = tw + k * stride;
-          const float* w2 = tw + 2 * k * stride;
-          const float* w3 = tw + 3 * k * stride;
-          Rotate(&t1r, &t1i, w1[0], w1[1]);
-          Rotate(&t2r, &t2i, w2[0], w2[1]);
-          Rotate(&t3r, &t3i, w3[0], w3[1]);
-        }
-        const float s02r = q0[k] + t2r, s02i = q0[k + 1] + t2i;
-        const float d02r = q0[k] - t2r, d02i = q0[k + 1] - t2i;
-        const float s13r = t1r + t3r, s13i = t1i + t3i;
-        const float d13r = t1r - t3r, d13i = t1i - t3i;
-        q0[k] = s02r + s13r;
-        q0[k + 1] = s02i + s13i;
-        q2[k] = s02r - s13r;
-        q2[k + 1] = s02i - s13i;
-        q1[k] = d02r - d13i;  // d02 + i d13.
-        q1[k + 1] = d02i + d13r;
-        q3[k] = d02r + d13i;  // d02 - i d13.
-        q3[k + 1] = d02i - d13r;
+      for (int32_t k = 0; k < 2 * len; k += 4) {
+        const int32_t w = k * stride;
+        const Float4 t1 = RotatePair(Load4(q2 + k), tw + w, 2 * stride, 1.0f);  // Phase 1.
+        const Float4 t2 = RotatePair(Load4(q1 + k), tw + 2 * w, 4 * stride, 1.0f);
+        const Float4 t3 = RotatePair(Load4(q3 + k), tw + 3 * w, 6 * stride, 1.0f);
+        const Float4 a0 = Load4(q0 + k);
+        const Float4 s02 = a0 + t2, d02 = a0 - t2, s13 = t1 + t3;
+        const Float4 rot = SwapPairs(t1 - t3) * plus_i;
+        Store4(q0 + k, s02 + s13);
+        Store4(q2 + k, s02 - s13);
+        Store4(q1 + k, d02 + rot);
+        Store4(q3 + k, d02 - rot);
       }
     }
   }

@@ -87,6 +87,7 @@ TEST(ZintarDetectorTest, RefusesInvalidConfigurations) {
       [](ZintarConfig* c) { c->peak_spread = 128; },
       [](ZintarConfig* c) { c->scaled_baseband_rate = 0; },
       [](ZintarConfig* c) { c->scaled_input_rate = c->scaled_baseband_rate - 1; },
+      [](ZintarConfig* c) { SetStandardZintarConfig(2000000, c); },  // r * 2032 overflows.
   };
   const ZintarConfig good = StandardConfig();
   ZintarDetector* detector = CreateZintarDetector(&good);
