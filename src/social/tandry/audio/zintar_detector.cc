@@ -42,7 +42,7 @@ constexpr double kPi = 3.14159265358979323846;
 struct ZintarFftPlan {
   int32_t size;
   int32_t odd_log2;  // Nonzero when log2(size) is odd: one radix-2 pass is needed.
-  float* twiddles;   // 3 size / 4 - 2 complex (cos, sin) of 2 pi k / size, interleaved.
+  float* twiddles;   // max(3 size / 4 - 2, 1) complex (cos, sin) of 2 pi k / size.
 };
 
 struct ZintarDetector {
