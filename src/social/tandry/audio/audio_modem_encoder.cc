@@ -53,6 +53,35 @@ float AudioModemEncoder::GetSampleRate() const {
   return 0.0f;
 }
 
+std::string DsssEncoderConfigError(const DsssEncoderConfig& config) {
+  const int max_code_number = config.number_of_taps <= 6 ? 2 : 3;
+  if (config.token_length_bytes < 1) return "the token needs at least one byte";
+  if (config.number_of_taps < 5 || config.number_of_taps > 11) {
+    return "the code register needs 5 to 11 taps";
+  }
+  if (config.code_number < 0 || config.code_number > max_code_number) {
+    return "code number must be 0 to " + std::to_string(max_code_number) + " for " +
+           std::to_string(config.number_of_taps) + " taps";
+  }
+  if (!(config.sample_rate > 0)) return "the coder sample rate must be positive";
+  if (config.upsampling_factor < 1) return "the upsampling factor must be positive";
+  if (config.baseband_decimation_factor < 1) return "the decimation factor must be positive";
+  if (config.upsampling_factor % config.baseband_decimation_factor != 0) {
+    return "the upsampling factor must be a multiple of the decimation factor";
+  }
+  if (!(config.carrier_frequency > 0 && config.carrier_frequency <= config.sample_rate / 2)) {
+    return "the carrier must lie above 0 Hz and at most at half the coder sample rate";
+  }
+  if (config.bits_per_symbol != 1 && config.bits_per_symbol != 2 && config.bits_per_symbol != 4 &&
+      config.bits_per_symbol != 8) {
+    return "bits per symbol must be 1, 2, 4 or 8";
+  }
+  if (config.min_cycles_per_frame < 0) return "cycles per frame must not be negative";
+  if (config.broadcast_sample_rate < 1) return "the broadcast sample rate must be positive";
+  if (!(config.transition_duration >= 0)) return "the transition must not be negative";
+  return std::string();
+}
+
 std::unique_ptr<AudioModemEncoder> MakeDsssAudioModemEncoder(const DsssEncoderConfig& config) {
   audio_vesknet::SymbolWaveCoderParams coder_params;
   audio_vesknet::GenerateCodeSignal(config.number_of_taps, config.code_number,

@@ -8,6 +8,7 @@
 
 #include <cstdint>
 #include <memory>
+#include <string>
 #include <vector>
 
 #include "audio/vesknet/vesknet_encoder.h"
@@ -67,6 +68,10 @@ struct DsssEncoderConfig {
   int broadcast_sample_rate = 48000;   // Hz.
   float transition_duration = 0.005f;  // Seconds.
 };
+
+// Empty when `config` can be built; otherwise a sentence saying what is wrong.
+// Lets tools refuse a configuration instead of aborting in a check.
+std::string DsssEncoderConfigError(const DsssEncoderConfig& config);
 
 // Builds the coder, the DSSS encoder and the front object from `config`.
 // Symbols per token = (8 / bits_per_symbol) x token_length_bytes, the
