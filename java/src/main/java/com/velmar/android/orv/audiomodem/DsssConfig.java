@@ -1,0 +1,284 @@
+package com.velmar.android.orv.audiomodem;
+
+/**
+ * What a DSSS transmitter and its receivers must agree on: the token layout and the waveform.
+ *
+ * <p>The defaults are the product configuration: 6 message bytes protected by 2 CRC-16 bytes, the
+ * 7-tap code 0, a 48000 Hz coder with 16 samples per chip and baseband decimation 4 (2032-sample
+ * frames), an 18500 Hz carrier, 4 bits per symbol, a 48000 Hz broadcast rate and a 5 ms start
+ * transition. This is the configuration that the zintar listening mode hears; {@link
+ * Builder#coder44100()} selects the older 44100 Hz coder (upsampling 15, decimation 3;
+ * 1905-sample frames), which the listening mode does not hear.
+ *
+ * <p>Immutable. {@link Builder#build()} validates every value, so that a bad value is an {@link
+ * IllegalArgumentException} here rather than an abort inside the native library.
+ */
+public final class DsssConfig {
+  private final int messageBytes;
+  private final int crcCheckBytes;
+  private final boolean checksumSymbol;
+  private final boolean singleSideband;
+  private final int numberOfTaps;
+  private final int codeNumber;
+  private final float coderSampleRate;
+  private final int upsamplingFactor;
+  private final float carrierFrequency;
+  private final int bitsPerSymbol;
+  private final int minCyclesPerFrame;
+  private final int basebandDecimationFactor;
+  private final boolean quadratureCarrier;
+  private final int broadcastSampleRate;
+  private final float transitionSeconds;
+
+  private DsssConfig(Builder b) {
+    messageBytes = b.messageBytes;
+    crcCheckBytes = b.crcCheckBytes;
+    checksumSymbol = b.checksumSymbol;
+    singleSideband = b.singleSideband;
+    numberOfTaps = b.numberOfTaps;
+    codeNumber = b.codeNumber;
+    coderSampleRate = b.coderSampleRate;
+    upsamplingFactor = b.upsamplingFactor;
+    carrierFrequency = b.carrierFrequency;
+    bitsPerSymbol = b.bitsPerSymbol;
+    minCyclesPerFrame = b.minCyclesPerFrame;
+    basebandDecimationFactor = b.basebandDecimationFactor;
+    quadratureCarrier = b.quadratureCarrier;
+    broadcastSampleRate = b.broadcastSampleRate;
+    transitionSeconds = b.transitionSeconds;
+  }
+
+  /** The product configuration. */
+  public static DsssConfig defaults() {
+    return builder().build();
+  }
+
+  public static Builder builder() {
+    return new Builder();
+  }
+
+  public Builder toBuilder() {
+    Builder b = new Builder();
+    b.messageBytes = messageBytes;
+    b.crcCheckBytes = crcCheckBytes;
+    b.checksumSymbol = checksumSymbol;
+    b.singleSideband = singleSideband;
+    b.numberOfTaps = numberOfTaps;
+    b.codeNumber = codeNumber;
+    b.coderSampleRate = coderSampleRate;
+    b.upsamplingFactor = upsamplingFactor;
+    b.carrierFrequency = carrierFrequency;
+    b.bitsPerSymbol = bitsPerSymbol;
+    b.minCyclesPerFrame = minCyclesPerFrame;
+    b.basebandDecimationFactor = basebandDecimationFactor;
+    b.quadratureCarrier = quadratureCarrier;
+    b.broadcastSampleRate = broadcastSampleRate;
+    b.transitionSeconds = transitionSeconds;
+    return b;
+  }
+
+  /** Message bytes per token, without check bytes. */
+  public int messageBytes() {
+    return messageBytes;
+  }
+
+  /** CRC-16 check bytes per token: 0 or 2. */
+  public int crcCheckBytes() {
+    return crcCheckBytes;
+  }
+
+  /** Bytes on air per token: message plus check bytes. */
+  public int tokenLengthBytes() {
+    return messageBytes + crcCheckBytes;
+  }
+
+  public boolean checksumSymbol() {
+    return checksumSymbol;
+  }
+
+  public boolean singleSideband() {
+    return singleSideband;
+  }
+
+  public int numberOfTaps() {
+    return numberOfTaps;
+  }
+
+  public int codeNumber() {
+    return codeNumber;
+  }
+
+  public float coderSampleRate() {
+    return coderSampleRate;
+  }
+
+  public int upsamplingFactor() {
+    return upsamplingFactor;
+  }
+
+  public float carrierFrequency() {
+    return carrierFrequency;
+  }
+
+  public int bitsPerSymbol() {
+    return bitsPerSymbol;
+  }
+
+  public int minCyclesPerFrame() {
+    return minCyclesPerFrame;
+  }
+
+  public int basebandDecimationFactor() {
+    return basebandDecimationFactor;
+  }
+
+  public boolean quadratureCarrier() {
+    return quadratureCarrier;
+  }
+
+  public int broadcastSampleRate() {
+    return broadcastSampleRate;
+  }
+
+  public float transitionSeconds() {
+    return transitionSeconds;
+  }
+
+  /** Coder samples per symbol: code length x upsampling factor. */
+  public int frameSize() {
+    return ((1 << numberOfTaps) - 1) * upsamplingFactor;
+  }
+
+  /** Symbols in one token on air: sync, data and, when enabled, checksum. */
+  public int framesPerToken() {
+    return 1 + (8 / bitsPerSymbol) * tokenLengthBytes() + (checksumSymbol ? 1 : 0);
+  }
+
+  /** Duration of one token on air, seconds. */
+  public double tokenSeconds() {
+    return (double) framesPerToken() * frameSize() / coderSampleRate;
+  }
+
+  /** Builder with the product defaults. */
+  public static final class Builder {
+    private int messageBytes = 6;
+    private int crcCheckBytes = 2;
+    private boolean checksumSymbol = false;
+    private boolean singleSideband = false;
+    private int numberOfTaps = 7;
+    private int codeNumber = 0;
+    private float coderSampleRate = 48000f;
+    private int upsamplingFactor = 16;
+    private float carrierFrequency = 18500f;
+    private int bitsPerSymbol = 4;
+    private int minCyclesPerFrame = 4;
+    private int basebandDecimationFactor = 4;
+    private boolean quadratureCarrier = false;
+    private int broadcastSampleRate = 48000;
+    private float transitionSeconds = 0.005f;
+
+    private Builder() {}
+
+    public Builder messageBytes(int value) {
+      messageBytes = value;
+      return this;
+    }
+
+    /** Whether two CRC-16 bytes protect each token (the default). */
+    public Builder crc(boolean enabled) {
+      crcCheckBytes = enabled ? 2 : 0;
+      return this;
+    }
+
+    public Builder checksumSymbol(boolean enabled) {
+      checksumSymbol = enabled;
+      return this;
+    }
+
+    public Builder singleSideband(boolean enabled) {
+      singleSideband = enabled;
+      return this;
+    }
+
+    /** The PN code: register length 5 to 11 and code number 0 to 2 (5, 6 taps) or 3. */
+    public Builder code(int numberOfTaps, int codeNumber) {
+      this.numberOfTaps = numberOfTaps;
+      this.codeNumber = codeNumber;
+      return this;
+    }
+
+    /** The coder: sample rate (Hz), samples per chip and baseband decimation. */
+    public Builder coder(float sampleRate, int upsamplingFactor, int basebandDecimationFactor) {
+      coderSampleRate = sampleRate;
+      this.upsamplingFactor = upsamplingFactor;
+      this.basebandDecimationFactor = basebandDecimationFactor;
+      return this;
+    }
+
+    /** The 44100 Hz coder with upsampling 15 and decimation 3 (1905-sample frames). */
+    public Builder coder44100() {
+      return coder(44100f, 15, 3);
+    }
+
+    public Builder carrierFrequency(float hertz) {
+      carrierFrequency = hertz;
+      return this;
+    }
+
+    /** 1, 2, 4 or 8. */
+    public Builder bitsPerSymbol(int value) {
+      bitsPerSymbol = value;
+      return this;
+    }
+
+    public Builder minCyclesPerFrame(int value) {
+      minCyclesPerFrame = value;
+      return this;
+    }
+
+    public Builder quadratureCarrier(boolean enabled) {
+      quadratureCarrier = enabled;
+      return this;
+    }
+
+    public Builder broadcastSampleRate(int hertz) {
+      broadcastSampleRate = hertz;
+      return this;
+    }
+
+    public Builder transitionSeconds(float seconds) {
+      transitionSeconds = seconds;
+      return this;
+    }
+
+    public DsssConfig build() {
+      require(messageBytes >= 1, "messageBytes must be at least 1");
+      require(numberOfTaps >= 5 && numberOfTaps <= 11, "numberOfTaps must be 5 to 11");
+      require(
+          codeNumber >= 0 && codeNumber <= (numberOfTaps <= 6 ? 2 : 3),
+          "codeNumber must be 0 to 2 for 5 or 6 taps, 0 to 3 otherwise");
+      require(coderSampleRate > 0, "coder sample rate must be positive");
+      require(upsamplingFactor > 0, "upsamplingFactor must be positive");
+      require(basebandDecimationFactor > 0, "basebandDecimationFactor must be positive");
+      require(
+          upsamplingFactor % basebandDecimationFactor == 0,
+          "upsamplingFactor must be a multiple of basebandDecimationFactor");
+      require(
+          carrierFrequency > 0 && carrierFrequency <= coderSampleRate / 2,
+          "carrierFrequency must lie in (0, coder sample rate / 2]");
+      require(
+          bitsPerSymbol == 1 || bitsPerSymbol == 2 || bitsPerSymbol == 4 || bitsPerSymbol == 8,
+          "bitsPerSymbol must be 1, 2, 4 or 8");
+      require(minCyclesPerFrame >= 0, "minCyclesPerFrame must not be negative");
+      require(broadcastSampleRate > 0, "broadcastSampleRate must be positive");
+      require(transitionSeconds >= 0, "transitionSeconds must not be negative");
+      return new DsssConfig(this);
+    }
+
+    private static void require(boolean condition, String message) {
+      if (!condition) {
+        throw new IllegalArgumentException(message);
+      }
+    }
+  }
+}

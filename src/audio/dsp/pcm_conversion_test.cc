@@ -1,0 +1,34 @@
+#include "audio/dsp/pcm_conversion.h"
+
+#include <cmath>
+#include <limits>
+#include <vector>
+
+#include "gtest/gtest.h"
+
+namespace audio_dsp {
+namespace {
+
+TEST(PcmConversionTest, TruncatesAndClamps) {
+  EXPECT_EQ(FloatToPcm16(1.0f), 32767);
+  EXPECT_EQ(FloatToPcm16(-1.0f), -32768);
+  EXPECT_EQ(FloatToPcm16(0.99999f), 32767);
+  EXPECT_EQ(FloatToPcm16(-0.00002f), 0);  // Toward zero, not down.
+  EXPECT_EQ(FloatToPcm16(0.5f), 16384);
+  EXPECT_EQ(FloatToPcm16(-0.5f), -16384);
+  EXPECT_EQ(FloatToPcm16(3.0f), 32767);
+  EXPECT_EQ(FloatToPcm16(-3.0f), -32768);
+  // Products beyond the 32-bit range and NaN give the most negative value.
+  EXPECT_EQ(FloatToPcm16(1e6f), -32768);
+  EXPECT_EQ(FloatToPcm16(std::numeric_limits<float>::infinity()), -32768);
+  EXPECT_EQ(FloatToPcm16(std::nanf("")), -32768);
+}
+
+TEST(PcmConversionTest, BytesAreLittleEndian) {
+  const std::vector<uint8_t> bytes = FloatsToPcm16Bytes({1.0f, -1.0f, 0.0f, -0.5f});
+  EXPECT_EQ(bytes, (std::vector<uint8_t>{0xFF, 0x7F, 0x00, 0x80, 0x00, 0x00, 0x00, 0xC0}));
+  EXPECT_TRUE(FloatsToPcm16Bytes({}).empty());
+}
+
+}  // namespace
+}  // namespace audio_dsp

@@ -1,0 +1,101 @@
+#include "audio/vesknet/vesknet_encoder.h"
+
+#include <algorithm>
+#include <cmath>
+
+#include "audio/dsp/kiss_fft_util.h"
+#include "base/logging.h"
+
+namespace audio_vesknet {
+
+int32_t ChecksumSymbol(int alphabet_size, const std::vector<int32_t>& symbols) {
+  const int32_t m = alphabet_size - 1;
+  int32_t sum = 0;
+  for (const int32_t symbol : symbols) sum += symbol;
+  return (m - sum % m) % m;
+}
+
+VesknetEncoder::VesknetEncoder(std::unique_ptr<SymbolWaveCoder> symbol_wave_coder,
+                               const VesknetEncoderParams& params)
+    : symbol_wave_coder_(CHECK_NOTNULL(std::move(symbol_wave_coder))), params_(params) {
+  CHECK(params_.broadcast_sample_rate > 0.0);
+  converter_ = std::make_unique<TokenSymbolConverter>(symbol_wave_coder_->params().bits_per_symbol);
+}
+
+bool VesknetEncoder::EncodeToken(const std::vector<uint8_t>& bytes,
+                                 std::vector<float>* output) const {
+  std::vector<int32_t> symbols;
+  converter_->BytesToSymbols(bytes, &symbols);
+  VLOG(1) << "Converted " << bytes.size() << " bytes to " << symbols.size() << " symbols.";
+  return EncodeSymbols(symbols, output);
+}
+
+bool VesknetEncoder::EncodeSymbols(const std::vector<int32_t>& symbols,
+                                   std::vector<float>* output) const {
+  if (static_cast<int>(symbols.size()) != params_.symbols_per_token) {
+    LOG(ERROR) << "EncodeSymbols() called with input of size " << symbols.size()
+               << ", but expected " << params_.symbols_per_token << ".";
+    return false;
+  }
+  if (output == nullptr) {
+    LOG(ERROR) << "EncodeSymbols() called with null output pointer.";
+    return false;
+  }
+  const SymbolWaveCoder& coder = *symbol_wave_coder_;
+  std::vector<int32_t> all_symbols = symbols;
+  if (params_.append_checksum_symbol) {
+    // The alphabet's last symbol is the sync symbol, so the data alphabet has
+    // alphabet_size - 1 symbols.
+    all_symbols.push_back(ChecksumSymbol(coder.alphabet_size(), symbols));
+  }
+
+  output->clear();
+  output->reserve((all_symbols.size() + 1) * coder.frame_size());
+  const std::vector<float>& sync = coder.GetSyncSymbolWave();
+  output->insert(output->end(), sync.begin(), sync.end());
+  for (const int32_t symbol : all_symbols) {
+    const std::vector<float>& wave = coder.GetSymbolWave(symbol);
+    output->insert(output->end(), wave.begin(), wave.end());
+  }
+
+  const float coder_rate = coder.params().sample_rate;
+  if (params_.single_sideband && !output->empty()) {
+    const float carrier = coder.carrier_cycles_per_frame() * coder_rate / coder.frame_size();
+    audio_dsp::HighPassFilter(*output, carrier, coder_rate, output);
+  }
+  audio_dsp::FftResample(*output, coder_rate, params_.broadcast_sample_rate, output);
+
+  float peak = 0.0f;
+  for (const float sample : *output) peak = std::max(peak, std::fabs(sample));
+  if (peak > 0.0f) {
+    const float scale = params_.peak_amplitude / peak;
+    for (float& sample : *output) sample *= scale;
+  }
+  return true;
+}
+
+bool VesknetEncoder::MakeStartTransition(const std::vector<float>& input,
+                                         std::vector<float>* output) const {
+  if (input.empty()) {
+    LOG(ERROR) << "MakeStartTransition() called with empty input.";
+    return false;
+  }
+  if (output == nullptr) {
+    LOG(ERROR) << "MakeStartTransition() called with null output pointer.";
+    return false;
+  }
+  const int n = std::max(
+      0, static_cast<int>(std::round(params_.transition_duration * params_.broadcast_sample_rate)));
+  const int64_t length = static_cast<int64_t>(input.size());
+  output->resize(n);
+  if (n == 0) return true;
+  // Start where reading on periodically ends exactly at input[length - 1].
+  const int64_t start = length - 1 - (n - 1) % length;
+  for (int i = 0; i < n; ++i) {
+    const float gain = static_cast<float>(i + 1) / static_cast<float>(n + 1);
+    (*output)[i] = gain * input[(start + i) % length];
+  }
+  return true;
+}
+
+}  // namespace audio_vesknet

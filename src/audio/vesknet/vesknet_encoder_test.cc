@@ -1,0 +1,158 @@
+#include "audio/vesknet/vesknet_encoder.h"
+
+#include <cmath>
+#include <complex>
+#include <memory>
+#include <vector>
+
+#include "audio/dsp/kiss_fft.h"
+#include "base/scoped_log_capture.h"
+#include "gtest/gtest.h"
+
+namespace audio_vesknet {
+namespace {
+
+SymbolWaveCoderParams ProductCoderParams() {
+  SymbolWaveCoderParams params;
+  params.sample_rate = 48000;
+  params.upsampling_factor = 16;
+  params.baseband_decimation_factor = 4;
+  return params;
+}
+
+std::unique_ptr<VesknetEncoder> MakeEncoder(const SymbolWaveCoderParams& coder_params,
+                                            VesknetEncoderParams params) {
+  return std::make_unique<VesknetEncoder>(std::make_unique<SymbolWaveCoder>(coder_params), params);
+}
+
+float Peak(const std::vector<float>& x) {
+  float peak = 0;
+  for (float v : x) peak = std::max(peak, std::fabs(v));
+  return peak;
+}
+
+const std::vector<uint8_t> kToken = {0x12, 0x34, 0x56, 0x78, 0x9A, 0xBC, 0xDE, 0xF0};
+
+TEST(VesknetEncoderTest, RecordDefaultsResampledTo48k) {
+  VesknetEncoderParams params;
+  params.broadcast_sample_rate = 48000;
+  const auto encoder = MakeEncoder(SymbolWaveCoderParams(), params);
+  std::vector<float> audio;
+  ASSERT_TRUE(encoder->EncodeToken(kToken, &audio));
+  // 17 frames of 1905 samples at 44100 Hz become round(32385 x 48000 / 44100).
+  EXPECT_EQ(audio.size(), 35249u);
+  EXPECT_FLOAT_EQ(Peak(audio), 0.5f);
+
+  std::vector<float> transition;
+  ASSERT_TRUE(encoder->MakeStartTransition(audio, &transition));
+  ASSERT_EQ(transition.size(), 240u);
+  // The ramp ends on the token's last sample, so playback runs on into audio[0].
+  EXPECT_FLOAT_EQ(transition.back(), audio.back() * 240.0f / 241.0f);
+  EXPECT_FLOAT_EQ(transition.front(), audio[audio.size() - 240] / 241.0f);
+}
+
+TEST(VesknetEncoderTest, ProductDefaultsAreWholeFramesOfSymbolWaves) {
+  VesknetEncoderParams params;
+  params.broadcast_sample_rate = 48000;  // Equal to the coder rate: no resampling.
+  const auto encoder = MakeEncoder(ProductCoderParams(), params);
+  std::vector<float> audio;
+  ASSERT_TRUE(encoder->EncodeToken(kToken, &audio));
+  ASSERT_EQ(audio.size(), 17u * 2032);
+  EXPECT_FLOAT_EQ(Peak(audio), 0.5f);
+  // Frame 0 is the sync symbol, then the nibbles of kToken, most significant
+  // first, all scaled by one common factor.
+  const SymbolWaveCoder& coder = encoder->symbol_wave_coder();
+  const std::vector<int> symbols = {16, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15, 0};
+  float used_peak = 0;
+  for (int symbol : symbols) used_peak = std::max(used_peak, Peak(coder.GetSymbolWave(symbol)));
+  const float scale = 0.5f / used_peak;
+  for (int frame = 0; frame < 17; ++frame) {
+    const std::vector<float>& wave = coder.GetSymbolWave(symbols[frame]);
+    for (int n = 0; n < 2032; n += 101) {
+      ASSERT_NEAR(audio[frame * 2032 + n], wave[n] * scale, 1e-6) << frame << " " << n;
+    }
+  }
+}
+
+TEST(VesknetEncoderTest, ChecksumSymbolMakesTheSumAMultipleOfSixteen) {
+  EXPECT_EQ(ChecksumSymbol(17, {10, 10, 10, 7}), 11);  // 37 + 11 = 48.
+  EXPECT_EQ(ChecksumSymbol(17, {16, 16}), 0);
+  VesknetEncoderParams params;
+  params.broadcast_sample_rate = 48000;
+  params.append_checksum_symbol = true;
+  const auto encoder = MakeEncoder(ProductCoderParams(), params);
+  std::vector<float> audio;
+  ASSERT_TRUE(encoder->EncodeToken(kToken, &audio));
+  EXPECT_EQ(audio.size(), 18u * 2032);  // One more frame.
+}
+
+TEST(VesknetEncoderTest, SingleSidebandRemovesEverythingBelowTheCarrier) {
+  VesknetEncoderParams params;
+  params.broadcast_sample_rate = 48000;
+  params.single_sideband = true;
+  const auto encoder = MakeEncoder(ProductCoderParams(), params);
+  std::vector<float> audio;
+  ASSERT_TRUE(encoder->EncodeToken(kToken, &audio));
+  const int n = static_cast<int>(audio.size());
+  audio_dsp::RealFFTTransformer fft(n, false);
+  std::vector<std::complex<float>> spectrum;
+  fft.Forward(audio, &spectrum);
+  const float carrier = encoder->symbol_wave_coder().carrier_frequency();
+  double below = 0, above = 0;
+  for (int k = 0; k < static_cast<int>(spectrum.size()); ++k) {
+    (k * 48000.0 / n < carrier - 1 ? below : above) += std::norm(spectrum[k]);
+  }
+  EXPECT_LT(below, 1e-6 * above);
+}
+
+TEST(VesknetEncoderTest, RefusesWrongInputWithoutTouchingTheOutput) {
+  VesknetEncoderParams params;
+  params.broadcast_sample_rate = 48000;
+  const auto encoder = MakeEncoder(ProductCoderParams(), params);
+  base::ScopedLogCapture capture;
+  std::vector<float> output = {1, 2, 3};
+  EXPECT_FALSE(encoder->EncodeSymbols(std::vector<int32_t>(15, 0), &output));
+  EXPECT_EQ(output, (std::vector<float>{1, 2, 3}));
+  EXPECT_FALSE(encoder->EncodeSymbols(std::vector<int32_t>(16, 0), nullptr));
+  EXPECT_FALSE(encoder->MakeStartTransition({}, &output));
+  EXPECT_FALSE(encoder->MakeStartTransition({1}, nullptr));
+  EXPECT_EQ(
+      capture.Messages(base::LogSeverity::kError),
+      (std::vector<std::string>{"EncodeSymbols() called with input of size 15, but expected 16.",
+                                "EncodeSymbols() called with null output pointer.",
+                                "MakeStartTransition() called with empty input.",
+                                "MakeStartTransition() called with null output pointer."}));
+}
+
+TEST(VesknetEncoderTest, TransitionLengthsAndWrapAround) {
+  VesknetEncoderParams params;
+  params.broadcast_sample_rate = 1000;
+  params.transition_duration = 0.0f;
+  std::vector<float> transition = {9};
+  EXPECT_TRUE(MakeEncoder(ProductCoderParams(), params)->MakeStartTransition({1}, &transition));
+  EXPECT_TRUE(transition.empty());
+  // Seven samples over a 3-sample input read it periodically, ending on input[2].
+  params.transition_duration = 0.007f;
+  ASSERT_TRUE(
+      MakeEncoder(ProductCoderParams(), params)->MakeStartTransition({10, 20, 30}, &transition));
+  const std::vector<float> periodic = {30, 10, 20, 30, 10, 20, 30};
+  ASSERT_EQ(transition.size(), 7u);
+  for (int i = 0; i < 7; ++i) EXPECT_FLOAT_EQ(transition[i], periodic[i] * (i + 1) / 8.0f);
+}
+
+TEST(VesknetEncoderDeathTest, ChecksConstruction) {
+  EXPECT_DEATH(VesknetEncoder(nullptr, VesknetEncoderParams()),
+               "Check failed: 'symbol_wave_coder' Must be non-null");
+  EXPECT_DEATH(MakeEncoder(ProductCoderParams(), VesknetEncoderParams()),
+               "Check failed: params_.broadcast_sample_rate > 0.0");
+  VesknetEncoderParams params;
+  params.broadcast_sample_rate = 48000;
+  const auto encoder = MakeEncoder(ProductCoderParams(), params);
+  std::vector<float> audio;
+  std::vector<int32_t> symbols(16, 0);
+  symbols[3] = 17;
+  EXPECT_DEATH(encoder->EncodeSymbols(symbols, &audio), "Check failed: symbol < alphabet_size_");
+}
+
+}  // namespace
+}  // namespace audio_vesknet

@@ -1,0 +1,113 @@
+// JNI entry points of com.velmar.android.orv.audiomodem.NativeEncoder.
+//
+// The library holds at most one encoder, in a process-wide slot. Entry points
+// convert Java arguments, delegate to the encoder in the slot and deliver the
+// audio through the receiver's setEncodeResults(byte[] startTransition,
+// byte[] tokenAudio, float sampleRate), both arrays 16-bit little-endian mono
+// PCM. No lock guards the slot: the host calls from one thread at a time.
+
+#include <jni.h>
+
+#include <memory>
+#include <utility>
+#include <vector>
+
+#include "audio/dsp/pcm_conversion.h"
+#include "base/logging.h"
+#include "location/pellam/cpp/audio/jni/jni_util.h"
+#include "social/tandry/audio/audio_modem_encoder.h"
+
+namespace {
+
+// The encoder slot: empty at load, replaced by each initialisation.
+std::unique_ptr<audio_modem::AudioModemEncoder>& EncoderSlot() {
+  static auto* slot = new std::unique_ptr<audio_modem::AudioModemEncoder>();
+  return *slot;
+}
+
+// Stores `encoder`, then destroys the one it replaces.
+void InstallEncoder(std::unique_ptr<audio_modem::AudioModemEncoder> encoder) {
+  EncoderSlot().swap(encoder);
+}
+
+jbyteArray ToPcmByteArray(JNIEnv* env, const std::vector<float>& samples) {
+  return vesk_jni::ToJavaByteArray(env, audio_dsp::FloatsToPcm16Bytes(samples));
+}
+
+}  // namespace
+
+extern "C" {
+
+JNIEXPORT jboolean JNICALL
+Java_com_velmar_android_orv_audiomodem_NativeEncoder_nativeInitializeDsss(
+    JNIEnv* /*env*/, jobject /*thiz*/, jint token_length_bytes, jboolean append_checksum_symbol,
+    jboolean single_sideband, jint number_of_taps, jint code_number, jfloat sample_rate,
+    jint upsampling_factor, jfloat carrier_frequency, jint bits_per_symbol,
+    jint min_cycles_per_frame, jint baseband_decimation_factor, jboolean use_quadrature_carrier,
+    jint broadcast_sample_rate, jfloat transition_duration) {
+  audio_modem::DsssEncoderConfig config;
+  config.token_length_bytes = token_length_bytes;
+  config.append_checksum_symbol = append_checksum_symbol;
+  config.single_sideband = single_sideband;
+  config.number_of_taps = number_of_taps;
+  config.code_number = code_number;
+  config.sample_rate = sample_rate;
+  config.upsampling_factor = upsampling_factor;
+  config.carrier_frequency = carrier_frequency;
+  config.bits_per_symbol = bits_per_symbol;
+  config.min_cycles_per_frame = min_cycles_per_frame;
+  config.baseband_decimation_factor = baseband_decimation_factor;
+  config.use_quadrature_carrier = use_quadrature_carrier;
+  config.broadcast_sample_rate = broadcast_sample_rate;
+  config.transition_duration = transition_duration;
+  InstallEncoder(audio_modem::MakeDsssAudioModemEncoder(config));
+  return JNI_TRUE;
+}
+
+JNIEXPORT jboolean JNICALL
+Java_com_velmar_android_orv_audiomodem_NativeEncoder_nativeInitializeDtmf(
+    JNIEnv* /*env*/, jobject /*thiz*/, jint /*bytes_in_token*/, jboolean /*append_checksum_symbol*/,
+    jfloat /*sample_rate*/, jint /*baseband_decimation_factor*/, jfloat /*window_duration*/,
+    jint /*tones_per_symbol*/, jfloat /*attack_time*/, jfloat /*decay_time*/,
+    jfloat /*sustain_time*/, jfloat /*release_time*/, jfloat /*sustain_amplitude*/,
+    jfloatArray /*tone_frequencies*/) {
+  LOG(ERROR) << "DTMF encoding is not available in this build.";
+  return JNI_FALSE;
+}
+
+JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeEncoder_nativeEncode(
+    JNIEnv* env, jobject /*thiz*/, jbyteArray token, jobject result_receiver,
+    jint num_crc_check_bytes) {
+  const jsize length = token == nullptr ? 0 : env->GetArrayLength(token);
+  if (length == 0) return;
+  std::vector<uint8_t> token_bytes(length);
+  env->GetByteArrayRegion(token, 0, length, reinterpret_cast<jbyte*>(token_bytes.data()));
+  if (env->ExceptionCheck()) return;
+
+  const std::unique_ptr<audio_modem::AudioModemEncoder>& encoder = EncoderSlot();
+  if (!encoder) {
+    LOG(ERROR) << "nativeEncode() called before a successful initialization.";
+    return;
+  }
+  std::vector<float> audio;
+  encoder->Encode(token_bytes, &audio, num_crc_check_bytes);
+
+  jmethodID set_encode_results =
+      vesk_jni::FindCallback(env, result_receiver, "setEncodeResults", "([B[BF)V");
+  if (set_encode_results == nullptr) return;
+  jbyteArray audio_array = ToPcmByteArray(env, audio);
+  if (audio_array == nullptr) return;
+  std::vector<float> transition;
+  encoder->MakeStartTransition(audio, &transition);
+  jbyteArray transition_array = ToPcmByteArray(env, transition);
+  if (transition_array == nullptr) return;
+  env->CallVoidMethod(result_receiver, set_encode_results, transition_array, audio_array,
+                      static_cast<jfloat>(encoder->GetSampleRate()));
+}
+
+JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeEncoder_nativeRelease(
+    JNIEnv* /*env*/, jobject /*thiz*/) {
+  EncoderSlot().reset();
+}
+
+}  // extern "C"

@@ -1,0 +1,29 @@
+#include "location/pellam/cpp/audio/jni/jni_util.h"
+
+#include "base/logging.h"
+
+namespace vesk_jni {
+
+jbyteArray ToJavaByteArray(JNIEnv* env, const std::vector<uint8_t>& bytes) {
+  const jsize length = static_cast<jsize>(bytes.size());
+  jbyteArray array = env->NewByteArray(length);
+  if (array == nullptr) return nullptr;
+  env->SetByteArrayRegion(array, 0, length, reinterpret_cast<const jbyte*>(bytes.data()));
+  if (env->ExceptionCheck()) return nullptr;
+  return array;
+}
+
+jmethodID FindCallback(JNIEnv* env, jobject receiver, const char* name, const char* signature) {
+  if (receiver == nullptr) return nullptr;
+  jclass receiver_class = env->GetObjectClass(receiver);
+  if (receiver_class == nullptr) return nullptr;
+  jmethodID method = env->GetMethodID(receiver_class, name, signature);
+  env->DeleteLocalRef(receiver_class);
+  if (method == nullptr) {
+    env->ExceptionClear();
+    LOG(ERROR) << "Receiver has no method " << name << " " << signature;
+  }
+  return method;
+}
+
+}  // namespace vesk_jni

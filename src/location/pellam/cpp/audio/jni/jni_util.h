@@ -1,0 +1,26 @@
+// Small helpers shared by the JNI entry points. Every helper tests for a
+// pending Java exception after touching a Java object and reports failure
+// instead of going on.
+
+#ifndef LOCATION_PELLAM_CPP_AUDIO_JNI_JNI_UTIL_H_
+#define LOCATION_PELLAM_CPP_AUDIO_JNI_JNI_UTIL_H_
+
+#include <jni.h>
+
+#include <cstdint>
+#include <vector>
+
+namespace vesk_jni {
+
+// A new Java byte array holding `bytes`, or null when it cannot be created
+// or a Java exception is pending after the copy.
+jbyteArray ToJavaByteArray(JNIEnv* env, const std::vector<uint8_t>& bytes);
+
+// The instance method `name` with `signature` of `receiver`'s class, or null
+// when the receiver has no class or no such method. A failed lookup's
+// NoSuchMethodError is cleared and logged: the library never throws into Java.
+jmethodID FindCallback(JNIEnv* env, jobject receiver, const char* name, const char* signature);
+
+}  // namespace vesk_jni
+
+#endif  // LOCATION_PELLAM_CPP_AUDIO_JNI_JNI_UTIL_H_

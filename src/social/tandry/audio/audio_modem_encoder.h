@@ -1,0 +1,83 @@
+// The encoder object that the JNI layer holds: one lower encoder (DSSS now,
+// DTMF with its modem) behind a token-size check and optional CRC-16 bytes.
+//
+// Not thread-safe: one thread at a time, like everything the JNI layer owns.
+
+#ifndef SOCIAL_TANDRY_AUDIO_AUDIO_MODEM_ENCODER_H_
+#define SOCIAL_TANDRY_AUDIO_AUDIO_MODEM_ENCODER_H_
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "audio/vesknet/vesknet_encoder.h"
+
+namespace audio_modem {
+
+class AudioModemEncoder {
+ public:
+  enum Kind { kDsss = 0, kDtmf = 1 };
+
+  // Takes ownership of a DSSS encoder. Token size = bits_per_symbol x
+  // symbols_per_token / 8 bytes, check bytes included.
+  explicit AudioModemEncoder(std::unique_ptr<audio_vesknet::VesknetEncoder> dsss_encoder);
+  ~AudioModemEncoder();
+
+  // Replaces *output with the audio of `token_bytes` followed by
+  // `num_crc_check_bytes` (0 or 2) CRC-16 bytes. A token whose size and
+  // check bytes do not add up to token_size(), a negative count or a count
+  // other than 0 and 2 is logged at ERROR and leaves *output unchanged.
+  void Encode(const std::vector<uint8_t>& token_bytes, std::vector<float>* output,
+              int num_crc_check_bytes) const;
+
+  // Replaces *transition with the fade-in to play before `audio` (empty for
+  // an empty `audio`).
+  void MakeStartTransition(const std::vector<float>& audio, std::vector<float>* transition) const;
+
+  // Sample rate of the encoded audio, Hz.
+  float GetSampleRate() const;
+
+  int token_size() const { return token_size_; }
+  Kind kind() const { return kind_; }
+
+ private:
+  std::unique_ptr<audio_vesknet::VesknetEncoder> dsss_encoder_;
+  Kind kind_;
+  int token_size_;
+};
+
+// Everything a host chooses about a DSSS encoder, in plain values; defaults
+// are the product configuration: 6 message + 2 CRC bytes, 7-tap code 0,
+// 48000 Hz coder with upsampling 16 and decimation 4 (2032-sample frames,
+// which the zintar listening mode hears), 18500 Hz carrier, 4 bits per
+// symbol, 4 cycles, 48000 Hz broadcast, 5 ms transition.
+struct DsssEncoderConfig {
+  int token_length_bytes = 8;  // Check bytes included.
+  bool append_checksum_symbol = false;
+  bool single_sideband = false;
+  int number_of_taps = 7;              // 5 to 11.
+  int code_number = 0;                 // 0 to 2 (5, 6 taps) or 3.
+  float sample_rate = 48000.0f;        // Coder rate, Hz.
+  int upsampling_factor = 16;          // Samples per chip.
+  float carrier_frequency = 18500.0f;  // Hz.
+  int bits_per_symbol = 4;             // 1, 2, 4 or 8.
+  int min_cycles_per_frame = 4;
+  int baseband_decimation_factor = 4;
+  bool use_quadrature_carrier = false;
+  int broadcast_sample_rate = 48000;   // Hz.
+  float transition_duration = 0.005f;  // Seconds.
+};
+
+// Empty when `config` can be built; otherwise a sentence saying what is wrong.
+// Lets tools refuse a configuration instead of aborting in a check.
+std::string DsssEncoderConfigError(const DsssEncoderConfig& config);
+
+// Builds the coder, the DSSS encoder and the front object from `config`.
+// Symbols per token = (8 / bits_per_symbol) x token_length_bytes, the
+// division first. A configuration that the coder rejects aborts.
+std::unique_ptr<AudioModemEncoder> MakeDsssAudioModemEncoder(const DsssEncoderConfig& config);
+
+}  // namespace audio_modem
+
+#endif  // SOCIAL_TANDRY_AUDIO_AUDIO_MODEM_ENCODER_H_

@@ -1,0 +1,77 @@
+#include "social/tandry/audio/audio_modem_encoder.h"
+
+#include <vector>
+
+#include "audio/vesknet/crc16_coder.h"
+#include "base/scoped_log_capture.h"
+#include "gtest/gtest.h"
+
+namespace audio_modem {
+namespace {
+
+TEST(AudioModemEncoderTest, ProductConfigurationEncodesSixBytesWithCrc) {
+  const auto encoder = MakeDsssAudioModemEncoder(DsssEncoderConfig());
+  EXPECT_EQ(encoder->token_size(), 8);
+  EXPECT_EQ(encoder->kind(), AudioModemEncoder::kDsss);
+  EXPECT_EQ(encoder->GetSampleRate(), 48000.0f);
+  std::vector<float> audio;
+  encoder->Encode({1, 2, 3, 4, 5, 6}, &audio, 2);
+  EXPECT_EQ(audio.size(), 17u * 2032);
+  std::vector<float> transition;
+  encoder->MakeStartTransition(audio, &transition);
+  EXPECT_EQ(transition.size(), 240u);
+}
+
+// The CRC bytes are appended before modulation: a 6-byte token with CRC sounds
+// exactly like the 8-byte token that carries those check bytes itself.
+TEST(AudioModemEncoderTest, CrcBytesAreAppendedBeforeModulation) {
+  const auto encoder = MakeDsssAudioModemEncoder(DsssEncoderConfig());
+  const std::vector<uint8_t> message = {0xCA, 0xFE, 0x00, 0x42, 0x99, 0x07};
+  std::vector<uint8_t> token = message;
+  audio_vesknet::Crc16CoderParams params;
+  params.num_message_bytes = 6;
+  audio_vesknet::Crc16Coder(params).AppendCrc(&token);
+  std::vector<float> with_crc, whole_token;
+  encoder->Encode(message, &with_crc, 2);
+  encoder->Encode(token, &whole_token, 0);
+  ASSERT_FALSE(with_crc.empty());
+  EXPECT_EQ(with_crc, whole_token);
+}
+
+TEST(AudioModemEncoderTest, RefusalsAreLoggedInOrderAndLeaveOutputAlone) {
+  const auto encoder = MakeDsssAudioModemEncoder(DsssEncoderConfig());
+  base::ScopedLogCapture capture;
+  std::vector<float> output = {7};
+  encoder->Encode(std::vector<uint8_t>(6), &output, 0);    // 6 + 0 != 8.
+  encoder->Encode(std::vector<uint8_t>(10), &output, -2);  // Adds up; negative.
+  encoder->Encode(std::vector<uint8_t>(7), &output, 1);    // Adds up; not 0 or 2.
+  EXPECT_EQ(output, std::vector<float>{7});
+  EXPECT_EQ(capture.Messages(base::LogSeverity::kError),
+            (std::vector<std::string>{
+                "token_bytes.size() and num_crc_check_bytes do not add to correct value",
+                "num_crc_check_bytes must be non-negative",
+                "Unsupported value for num_crc_check_bytes"}));
+  // An empty audio vector has an empty transition.
+  std::vector<float> transition = {1};
+  encoder->MakeStartTransition({}, &transition);
+  EXPECT_TRUE(transition.empty());
+}
+
+TEST(AudioModemEncoderTest, RecordDefaultsAreOneConfigurationAway) {
+  DsssEncoderConfig config;
+  config.sample_rate = 44100;
+  config.upsampling_factor = 15;
+  config.baseband_decimation_factor = 3;
+  const auto encoder = MakeDsssAudioModemEncoder(config);
+  std::vector<float> audio;
+  encoder->Encode(std::vector<uint8_t>(8, 0xA5), &audio, 0);
+  EXPECT_EQ(audio.size(), 35249u);
+}
+
+TEST(AudioModemEncoderDeathTest, NeedsAnEncoder) {
+  EXPECT_DEATH(AudioModemEncoder(std::unique_ptr<audio_vesknet::VesknetEncoder>()),
+               "Check failed: 'dsss_encoder' Must be non-null");
+}
+
+}  // namespace
+}  // namespace audio_modem
