@@ -12,7 +12,7 @@ namespace {
 
 std::string TempPath(const std::string& name) { return ::testing::TempDir() + "/" + name; }
 
-int Run(const std::vector<std::string>& args, std::string* out, std::string* err) {
+int RunEncodeCommand(const std::vector<std::string>& args, std::string* out, std::string* err) {
   std::ostringstream o, e;
   const int status = RunEncode(args, o, e);
   *out = o.str();
@@ -23,7 +23,7 @@ int Run(const std::vector<std::string>& args, std::string* out, std::string* err
 TEST(EncodeCommandTest, WritesTransitionAndRepeatedToken) {
   const std::string path = TempPath("encode_test.wav");
   std::string out, err;
-  ASSERT_EQ(Run({"--message", "010203040506", "--repeat", "2", path}, &out, &err), 0) << err;
+  ASSERT_EQ(RunEncodeCommand({"--message", "010203040506", "--repeat", "2", path}, &out, &err), 0) << err;
   PcmAudio audio;
   ASSERT_TRUE(ReadAudioFile(path, &audio, &err)) << err;
   EXPECT_EQ(audio.sample_rate, 48000);
@@ -43,7 +43,7 @@ TEST(EncodeCommandTest, WritesTransitionAndRepeatedToken) {
 TEST(EncodeCommandTest, PresetAndOverrides) {
   const std::string path = TempPath("encode_44k.wav");
   std::string out, err;
-  ASSERT_EQ(Run({"--preset", "44k", "--no-crc", "--message", "0102030405060708", "--repeat", "1",
+  ASSERT_EQ(RunEncodeCommand({"--preset", "44k", "--no-crc", "--message", "0102030405060708", "--repeat", "1",
                  "--transition", "0", path},
                 &out, &err),
             0)
@@ -67,10 +67,10 @@ TEST(EncodeCommandTest, BadInputIsAUsageErrorNotACrash) {
                                              {path, "--preset", "96k"},
                                              {"--repeat", "0", path},
                                              {}}) {
-    EXPECT_EQ(Run(args, &out, &err), 2) << (args.empty() ? "" : args.back());
+    EXPECT_EQ(RunEncodeCommand(args, &out, &err), 2) << (args.empty() ? "" : args.back());
     EXPECT_FALSE(err.empty());
   }
-  EXPECT_EQ(Run({"/nonexistent-dir/x.wav"}, &out, &err), 1);
+  EXPECT_EQ(RunEncodeCommand({"/nonexistent-dir/x.wav"}, &out, &err), 1);
 }
 
 }  // namespace

@@ -1,5 +1,7 @@
 #include "audio/dsp/pcm_conversion.h"
 
+#include <cstddef>
+
 namespace audio_dsp {
 
 int16_t FloatToPcm16(float sample) {
@@ -17,7 +19,7 @@ int16_t FloatToPcm16(float sample) {
 
 std::vector<uint8_t> FloatsToPcm16Bytes(const std::vector<float>& samples) {
   std::vector<uint8_t> bytes(samples.size() * 2);
-  for (size_t i = 0; i < samples.size(); ++i) {
+  for (std::size_t i = 0; i < samples.size(); ++i) {
     const uint16_t v = static_cast<uint16_t>(FloatToPcm16(samples[i]));
     bytes[2 * i] = static_cast<uint8_t>(v & 0xFF);
     bytes[2 * i + 1] = static_cast<uint8_t>(v >> 8);

@@ -71,7 +71,11 @@ TEST(AcquisitionScorerTest, PeaksWhereAFrameStarts) {
   scorer.ComputeScores(signal.real, signal.imag, &scores);
   // 1000 - 127 + 1 positions scored, the output trailing by the smoother's delay.
   EXPECT_EQ(static_cast<int>(scores.size()), 1000 - 127 + 1 - scorer.noise_delay());
-  for (int i = 0; i < scorer.warm_up() - 1; ++i) EXPECT_EQ(scores[i], 0.0f);
+  // Output i is made once position i + D is scored; until warm-up - 1
+  // positions have been scored there is no background yet and it is 0.
+  const int first_scored = scorer.warm_up() - 1 - scorer.noise_delay();
+  for (int i = 0; i < first_scored; ++i) EXPECT_EQ(scores[i], 0.0f);
+  EXPECT_GT(scores[first_scored], 0.0f);
   const int peak = std::max_element(scores.begin(), scores.end()) - scores.begin();
   EXPECT_EQ(peak, 300);
   EXPECT_GT(scores[300], 20.0f);  // Far above the background level of about 1.
@@ -84,9 +88,14 @@ TEST(AcquisitionScorerTest, BestShiftFollowsTheDoppler) {
     const Signal frame = MakeSignal(code, 127, {0}, kShifts[shift_index], 0.0f, 1);
     std::vector<float> energies;
     scorer.ScoreFrame(frame.real, frame.imag, &energies);
+    // The phasors turn forward, so shift s compensates a rotation of
+    // -shifts[s]; the list is symmetric.
     const int best = std::max_element(energies.begin(), energies.end()) - energies.begin();
-    EXPECT_EQ(best, shift_index);
-    EXPECT_NEAR(energies[best], 127.0f * 127.0f, 127.0f * 127.0f * 0.02f);
+    EXPECT_EQ(best, 4 - shift_index);
+    // Within a chunk the rotation is not compensated: at 2 cycles per frame
+    // and 16 chunks that costs sinc^2(pi 2 / 16), about 5%.
+    EXPECT_GT(energies[best], 0.94f * 127.0f * 127.0f);
+    EXPECT_LE(energies[best], 1.001f * 127.0f * 127.0f);
   }
 }
 
@@ -113,9 +122,9 @@ TEST(AcquisitionScorerTest, BroadcasterScoreNeedsAWindowAndARepeatingCode) {
   AcquisitionScorer scorer(code, kShifts, 8, 20.0f, window);
   std::vector<float> scores;
   // Noise alone: nothing stands out.
-  Signal noise = MakeSignal(code, window, {}, 0.0f, 1.0f, 3);
+  Signal noise = MakeSignal(code, window - 1, {}, 0.0f, 1.0f, 3);
   scorer.ComputeScores(noise.real, noise.imag, &scores);
-  // window - 127 + 1 positions: not more than W - F yet.
+  // window - 127 positions scored: not more than W - F yet.
   EXPECT_EQ(scorer.GetBroadcasterScore(true), 0.0f);
   noise = MakeSignal(code, 1000, {}, 0.0f, 1.0f, 4);
   scorer.ComputeScores(noise.real, noise.imag, &scores);

@@ -17,7 +17,7 @@ int32_t ChecksumSymbol(int alphabet_size, const std::vector<int32_t>& symbols) {
 
 VesknetEncoder::VesknetEncoder(std::unique_ptr<SymbolWaveCoder> symbol_wave_coder,
                                const VesknetEncoderParams& params)
-    : symbol_wave_coder_(CHECK_NOTNULL(std::move(symbol_wave_coder))), params_(params) {
+    : symbol_wave_coder_(std::move(CHECK_NOTNULL(symbol_wave_coder))), params_(params) {
   CHECK(params_.broadcast_sample_rate > 0.0);
   converter_ = std::make_unique<TokenSymbolConverter>(symbol_wave_coder_->params().bits_per_symbol);
 }

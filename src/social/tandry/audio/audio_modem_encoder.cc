@@ -9,7 +9,7 @@
 namespace audio_modem {
 
 AudioModemEncoder::AudioModemEncoder(std::unique_ptr<audio_vesknet::VesknetEncoder> dsss_encoder)
-    : dsss_encoder_(CHECK_NOTNULL(std::move(dsss_encoder))), kind_(kDsss) {
+    : dsss_encoder_(std::move(CHECK_NOTNULL(dsss_encoder))), kind_(kDsss) {
   token_size_ = dsss_encoder_->symbol_wave_coder().params().bits_per_symbol *
                 dsss_encoder_->params().symbols_per_token / 8;
 }

@@ -51,7 +51,7 @@ class TokenEncoderTest {
   @Test
   void newerEncoderRetiresTheOlder() {
     TokenEncoder first = TokenEncoder.create(DsssConfig.defaults());
-    try (TokenEncoder second = TokenEncoder.create(DsssConfig.builder().crc(false).build())) {
+    try (TokenEncoder second = TokenEncoder.create(DsssConfig.builder().crc(false).messageBytes(8).build())) {
       assertThrows(IllegalStateException.class, () -> first.encode(MESSAGE));
       assertEquals(17 * 2032, second.encode(new byte[8]).tokenAudio().length / 2);
       first.close(); // Does not free the second one's native encoder.
