@@ -38,8 +38,8 @@ int RunDemo(const std::vector<std::string>& args, std::ostream& out, std::ostrea
   out << "Vesk DSSS demo\n";
   std::snprintf(line, sizeof(line),
                 "token: %s + CRC-16 (%d bytes on air), carrier %.0f Hz, %d-sample frames\n",
-                ToHex(message).c_str(), encoder->token_size(), config.carrier_frequency,
-                config.upsampling_factor * 127);
+                ToHex(message).c_str(), encoder->token_size(), config.waveform.carrier_frequency,
+                config.waveform.upsampling_factor * 127);
   out << line;
   std::snprintf(line, sizeof(line),
                 "audio: %zu samples at %.0f Hz (%.3f s), peak %.3f, RMS %.3f; transition %zu "

@@ -23,7 +23,8 @@ int RunEncodeCommand(const std::vector<std::string>& args, std::string* out, std
 TEST(EncodeCommandTest, WritesTransitionAndRepeatedToken) {
   const std::string path = TempPath("encode_test.wav");
   std::string out, err;
-  ASSERT_EQ(RunEncodeCommand({"--message", "010203040506", "--repeat", "2", path}, &out, &err), 0) << err;
+  ASSERT_EQ(RunEncodeCommand({"--message", "010203040506", "--repeat", "2", path}, &out, &err), 0)
+      << err;
   PcmAudio audio;
   ASSERT_TRUE(ReadAudioFile(path, &audio, &err)) << err;
   EXPECT_EQ(audio.sample_rate, 48000);
@@ -43,9 +44,9 @@ TEST(EncodeCommandTest, WritesTransitionAndRepeatedToken) {
 TEST(EncodeCommandTest, PresetAndOverrides) {
   const std::string path = TempPath("encode_44k.wav");
   std::string out, err;
-  ASSERT_EQ(RunEncodeCommand({"--preset", "44k", "--no-crc", "--message", "0102030405060708", "--repeat", "1",
-                 "--transition", "0", path},
-                &out, &err),
+  ASSERT_EQ(RunEncodeCommand({"--preset", "44k", "--no-crc", "--message", "0102030405060708",
+                              "--repeat", "1", "--transition", "0", path},
+                             &out, &err),
             0)
       << err;
   PcmAudio audio;

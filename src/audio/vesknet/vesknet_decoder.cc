@@ -52,10 +52,10 @@ VesknetDecoder::VesknetDecoder(const SymbolWaveCoder* symbol_wave_coder,
 
   if (params_.design_baseband_filter) {
     // Sharpness: one chip in baseband samples.
-    baseband_filter_taps_ = MakeComplexLowpassFilter(
-        params_.baseband_filter_length, params_.baseband_filter_cutoff,
-        static_cast<float>(coder_params.upsampling_factor /
-                           coder_params.baseband_decimation_factor));
+    baseband_filter_taps_ =
+        MakeComplexLowpassFilter(params_.baseband_filter_length, params_.baseband_filter_cutoff,
+                                 static_cast<float>(coder_params.upsampling_factor /
+                                                    coder_params.baseband_decimation_factor));
   } else {
     baseband_filter_taps_ = {0.25f, 0.5f, 0.25f};
   }
@@ -72,8 +72,8 @@ VesknetDecoder::VesknetDecoder(const SymbolWaveCoder* symbol_wave_coder,
 
   // Chunks short enough that the largest shift turns the phase by at most a
   // sixteenth of a cycle within one.
-  chunk_length_ = std::max(
-      1, static_cast<int>(std::ceil(frame_size_ / std::max(16.0f * max_shift, 1.0f))));
+  chunk_length_ =
+      std::max(1, static_cast<int>(std::ceil(frame_size_ / std::max(16.0f * max_shift, 1.0f))));
   const int extension = static_cast<int>(std::ceil(frame_size_ * params_.frame_extension));
   extended_size_ = audio_dsp::RoundUpToMultiple(frame_size_ + 2 * extension, chunk_length_);
   left_extension_ = (extended_size_ - frame_size_) / 2;
@@ -89,6 +89,12 @@ VesknetDecoder::VesknetDecoder(const SymbolWaveCoder* symbol_wave_coder,
   MakeFrequencyOffsets(params_.decode_doppler_step, max_shift, &decode_shifts_);
   MakePhasorMatrix(-2.0 * M_PI * chunk_length_ / frame_size_, decode_shifts_,
                    extended_size_ / chunk_length_, &decode_phasors_);
+}
+
+VesknetDecoder::VesknetDecoder(std::unique_ptr<const SymbolWaveCoder> symbol_wave_coder,
+                               const VesknetDecoderParams& params)
+    : VesknetDecoder(symbol_wave_coder.get(), params) {
+  owned_coder_ = std::move(symbol_wave_coder);
 }
 
 VesknetDecoder::~VesknetDecoder() = default;
@@ -172,7 +178,8 @@ void VesknetDecoder::ProcessSamples(const std::vector<float>& received_samples) 
   if (params_.save_received_samples) {
     received_history_.Append(mono, mono_count);
     const int keep = static_cast<int>(std::round(kSavedSeconds * received_rate_));
-    if (received_history_.size() > keep) received_history_.DropOldest(received_history_.size() - keep);
+    if (received_history_.size() > keep)
+      received_history_.DropOldest(received_history_.size() - keep);
   }
 
   // Down to complex baseband around the carrier.

@@ -100,8 +100,8 @@ struct VesknetDecoderParams {
 // What GetToken() found.
 struct VesknetDecodeResults {
   std::vector<TokenCandidate> token_candidates;  // Best first; bytes filled in.
-  std::vector<float> frame_times;    // Seconds since Initialize, one per group member.
-  std::vector<float> frame_scores;   // Their filtered acquisition scores.
+  std::vector<float> frame_times;                // Seconds since Initialize, one per group member.
+  std::vector<float> frame_scores;               // Their filtered acquisition scores.
   std::map<int, std::vector<float>> frame_symbol_scores;  // Frame number -> symbol scores.
   audio_dsp::MatrixXf scores_table;  // Alphabet x token period, from the token selector.
 };
@@ -110,6 +110,9 @@ class VesknetDecoder {
  public:
   // `symbol_wave_coder` must outlive the decoder.
   VesknetDecoder(const SymbolWaveCoder* symbol_wave_coder, const VesknetDecoderParams& params);
+  // The decoder owns `symbol_wave_coder`.
+  VesknetDecoder(std::unique_ptr<const SymbolWaveCoder> symbol_wave_coder,
+                 const VesknetDecoderParams& params);
   ~VesknetDecoder();
 
   // (Re)starts all streaming state for input at `sample_rate` Hz with
@@ -161,6 +164,7 @@ class VesknetDecoder {
   void DropHistory(int input_frames);
   int TokenPeriodFrames() const;
 
+  std::unique_ptr<const SymbolWaveCoder> owned_coder_;  // May be empty.
   const SymbolWaveCoder* coder_;
   VesknetDecoderParams params_;
   TokenSelector token_selector_;

@@ -2,7 +2,6 @@
 
 #include <utility>
 
-#include "audio/vesknet/code_signal_generator.h"
 #include "audio/vesknet/crc16_coder.h"
 #include "base/logging.h"
 
@@ -54,52 +53,22 @@ float AudioModemEncoder::GetSampleRate() const {
 }
 
 std::string DsssEncoderConfigError(const DsssEncoderConfig& config) {
-  const int max_code_number = config.number_of_taps <= 6 ? 2 : 3;
   if (config.token_length_bytes < 1) return "the token needs at least one byte";
-  if (config.number_of_taps < 5 || config.number_of_taps > 11) {
-    return "the code register needs 5 to 11 taps";
-  }
-  if (config.code_number < 0 || config.code_number > max_code_number) {
-    return "code number must be 0 to " + std::to_string(max_code_number) + " for " +
-           std::to_string(config.number_of_taps) + " taps";
-  }
-  if (!(config.sample_rate > 0)) return "the coder sample rate must be positive";
-  if (config.upsampling_factor < 1) return "the upsampling factor must be positive";
-  if (config.baseband_decimation_factor < 1) return "the decimation factor must be positive";
-  if (config.upsampling_factor % config.baseband_decimation_factor != 0) {
-    return "the upsampling factor must be a multiple of the decimation factor";
-  }
-  if (!(config.carrier_frequency > 0 && config.carrier_frequency <= config.sample_rate / 2)) {
-    return "the carrier must lie above 0 Hz and at most at half the coder sample rate";
-  }
-  if (config.bits_per_symbol != 1 && config.bits_per_symbol != 2 && config.bits_per_symbol != 4 &&
-      config.bits_per_symbol != 8) {
-    return "bits per symbol must be 1, 2, 4 or 8";
-  }
-  if (config.min_cycles_per_frame < 0) return "cycles per frame must not be negative";
+  const std::string waveform_error = DsssWaveformConfigError(config.waveform);
+  if (!waveform_error.empty()) return waveform_error;
   if (config.broadcast_sample_rate < 1) return "the broadcast sample rate must be positive";
   if (!(config.transition_duration >= 0)) return "the transition must not be negative";
   return std::string();
 }
 
 std::unique_ptr<AudioModemEncoder> MakeDsssAudioModemEncoder(const DsssEncoderConfig& config) {
-  audio_vesknet::SymbolWaveCoderParams coder_params;
-  audio_vesknet::GenerateCodeSignal(config.number_of_taps, config.code_number,
-                                    &coder_params.code_signal);
-  coder_params.sample_rate = config.sample_rate;
-  coder_params.upsampling_factor = config.upsampling_factor;
-  coder_params.desired_carrier_frequency = config.carrier_frequency;
-  coder_params.bits_per_symbol = config.bits_per_symbol;
-  coder_params.min_cycles_per_frame = config.min_cycles_per_frame;
-  coder_params.baseband_decimation_factor = config.baseband_decimation_factor;
-  coder_params.use_quadrature_carrier = config.use_quadrature_carrier;
-  auto coder = std::make_unique<audio_vesknet::SymbolWaveCoder>(coder_params);
-
+  std::unique_ptr<audio_vesknet::SymbolWaveCoder> coder = MakeSymbolWaveCoder(config.waveform);
   audio_vesknet::VesknetEncoderParams encoder_params;
   // Integer division first, as hosts have always been told: with 3 bits per
   // symbol a 6-byte token would give 12 symbols (the symbol converter then
   // rejects 3 bits). The coder above has already rejected bits_per_symbol 0.
-  encoder_params.symbols_per_token = (8 / config.bits_per_symbol) * config.token_length_bytes;
+  encoder_params.symbols_per_token =
+      (8 / config.waveform.bits_per_symbol) * config.token_length_bytes;
   encoder_params.append_checksum_symbol = config.append_checksum_symbol;
   encoder_params.single_sideband = config.single_sideband;
   encoder_params.transition_duration = config.transition_duration;

@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "audio/vesknet/vesknet_encoder.h"
+#include "social/tandry/audio/dsss_waveform_config.h"
 
 namespace audio_modem {
 
@@ -48,25 +49,15 @@ class AudioModemEncoder {
 };
 
 // Everything a host chooses about a DSSS encoder, in plain values; defaults
-// are the product configuration: 6 message + 2 CRC bytes, 7-tap code 0,
-// 48000 Hz coder with upsampling 16 and decimation 4 (2032-sample frames,
-// which the zintar listening mode hears), 18500 Hz carrier, 4 bits per
-// symbol, 4 cycles, 48000 Hz broadcast, 5 ms transition.
+// are the product configuration: 6 message + 2 CRC bytes on the product
+// waveform, broadcast at 48000 Hz after a 5 ms transition.
 struct DsssEncoderConfig {
-  int token_length_bytes = 8;  // Check bytes included.
+  int token_length_bytes = 8;  // Check bytes included, >= 1.
   bool append_checksum_symbol = false;
   bool single_sideband = false;
-  int number_of_taps = 7;              // 5 to 11.
-  int code_number = 0;                 // 0 to 2 (5, 6 taps) or 3.
-  float sample_rate = 48000.0f;        // Coder rate, Hz.
-  int upsampling_factor = 16;          // Samples per chip.
-  float carrier_frequency = 18500.0f;  // Hz.
-  int bits_per_symbol = 4;             // 1, 2, 4 or 8.
-  int min_cycles_per_frame = 4;
-  int baseband_decimation_factor = 4;
-  bool use_quadrature_carrier = false;
-  int broadcast_sample_rate = 48000;   // Hz.
-  float transition_duration = 0.005f;  // Seconds.
+  DsssWaveformConfig waveform;
+  int broadcast_sample_rate = 48000;   // Hz, > 0.
+  float transition_duration = 0.005f;  // Seconds, >= 0.
 };
 
 // Empty when `config` can be built; otherwise a sentence saying what is wrong.

@@ -59,13 +59,28 @@ TEST(AudioModemEncoderTest, RefusalsAreLoggedInOrderAndLeaveOutputAlone) {
 
 TEST(AudioModemEncoderTest, RecordDefaultsAreOneConfigurationAway) {
   DsssEncoderConfig config;
-  config.sample_rate = 44100;
-  config.upsampling_factor = 15;
-  config.baseband_decimation_factor = 3;
+  config.waveform = Waveform44100();
   const auto encoder = MakeDsssAudioModemEncoder(config);
   std::vector<float> audio;
   encoder->Encode(std::vector<uint8_t>(8, 0xA5), &audio, 0);
   EXPECT_EQ(audio.size(), 35249u);
+}
+
+TEST(AudioModemEncoderTest, ConfigErrorsAreSentencesNotAborts) {
+  EXPECT_EQ(DsssEncoderConfigError(DsssEncoderConfig()), "");
+  DsssEncoderConfig config;
+  config.waveform.code_number = 3;
+  config.waveform.number_of_taps = 6;
+  EXPECT_EQ(DsssEncoderConfigError(config), "code number must be 0 to 2 for 6 taps");
+  config = DsssEncoderConfig();
+  config.waveform.baseband_decimation_factor = 5;
+  EXPECT_NE(DsssEncoderConfigError(config), "");
+  config = DsssEncoderConfig();
+  config.waveform.bits_per_symbol = 3;
+  EXPECT_NE(DsssEncoderConfigError(config), "");
+  config = DsssEncoderConfig();
+  config.transition_duration = -1;
+  EXPECT_NE(DsssEncoderConfigError(config), "");
 }
 
 TEST(AudioModemEncoderDeathTest, NeedsAnEncoder) {

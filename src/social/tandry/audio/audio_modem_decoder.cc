@@ -1,0 +1,135 @@
+#include "social/tandry/audio/audio_modem_decoder.h"
+
+#include <algorithm>
+#include <cmath>
+#include <utility>
+
+#include "audio/vesknet/crc16_coder.h"
+#include "base/logging.h"
+
+namespace audio_modem {
+
+AudioModemDecoder::AudioModemDecoder(std::unique_ptr<audio_vesknet::VesknetDecoder> dsss_decoder)
+    : dsss_decoder_(std::move(CHECK_NOTNULL(dsss_decoder))), kind_(kDsss) {
+  token_size_ = dsss_decoder_->symbol_wave_coder().params().bits_per_symbol *
+                dsss_decoder_->params().symbols_in_token / 8;
+}
+
+AudioModemDecoder::~AudioModemDecoder() = default;
+
+void AudioModemDecoder::Initialize(float sample_rate, int num_channels) {
+  if (kind_ == kDsss) dsss_decoder_->Initialize(sample_rate, num_channels);
+}
+
+void AudioModemDecoder::ProcessSamples(const std::vector<float>& samples) {
+  if (kind_ == kDsss) dsss_decoder_->ProcessSamples(samples);
+}
+
+void AudioModemDecoder::ProcessSamplesWithZintar(int16_t* /*samples*/, int /*count*/) {
+  // Only the zintar kind listens to raw samples.
+}
+
+bool AudioModemDecoder::DetectBroadcaster() {
+  if (kind_ == kDsss) return dsss_decoder_->DetectBroadcaster();
+  return false;
+}
+
+void AudioModemDecoder::WipeInternalData() {
+  if (kind_ == kDsss) dsss_decoder_->WipeInternalData();
+}
+
+int AudioModemDecoder::GetMaxSafeInputSize() const {
+  if (kind_ == kDsss) {
+    const int frames = dsss_decoder_->max_buffer_size() - dsss_decoder_->buffered_input_frames();
+    return std::max(0, frames) * dsss_decoder_->num_channels();
+  }
+  return 0;
+}
+
+bool AudioModemDecoder::GetTokens(DecodeResults* decode_results, int num_message_bytes,
+                                  int num_crc_check_bytes) {
+  CHECK(decode_results);
+  if (num_message_bytes + num_crc_check_bytes != token_size_) {
+    LOG(ERROR) << "num_message_bytes and num_crc_check_bytes do not add to correct value";
+    return false;
+  }
+  if (num_message_bytes < 1) {
+    LOG(ERROR) << "num_message_bytes must be positive";
+    return false;
+  }
+  if (num_crc_check_bytes < 0) {
+    LOG(ERROR) << "num_crc_check_bytes must be non-negative";
+    return false;
+  }
+  decode_results->tokens.clear();
+
+  DecodeResults raw;
+  if (kind_ == kDsss) {
+    audio_vesknet::VesknetDecodeResults dsss_results;
+    if (!dsss_decoder_->GetToken(&dsss_results)) return false;
+    for (audio_vesknet::TokenCandidate& candidate : dsss_results.token_candidates) {
+      raw.tokens.push_back({std::move(candidate.bytes), candidate.start_index, candidate.score});
+    }
+    raw.frame_times = std::move(dsss_results.frame_times);
+    raw.frame_scores = std::move(dsss_results.frame_scores);
+  } else {
+    return false;
+  }
+
+  if (num_crc_check_bytes == 0) {
+    *decode_results = std::move(raw);
+    return true;
+  }
+  if (num_crc_check_bytes != 2) {
+    LOG(ERROR) << "Unsupported value for num_crc_check_bytes";
+    return false;
+  }
+  audio_vesknet::Crc16CoderParams crc_params;
+  crc_params.num_message_bytes = num_message_bytes;
+  const audio_vesknet::Crc16Coder crc(crc_params);
+  for (TokenResult& token : raw.tokens) {
+    if (!crc.CheckCrc(token.bytes)) continue;
+    token.bytes.resize(num_message_bytes);
+    decode_results->tokens.push_back(std::move(token));
+  }
+  decode_results->frame_times = std::move(raw.frame_times);
+  decode_results->frame_scores = std::move(raw.frame_scores);
+  return !decode_results->tokens.empty();
+}
+
+std::string DsssDecoderConfigError(const DsssDecoderConfig& config) {
+  if (config.token_length_bytes < 1) return "the token needs at least one byte";
+  const std::string waveform_error = DsssWaveformConfigError(config.waveform);
+  if (!waveform_error.empty()) return waveform_error;
+  if (!(config.acquisition_window_seconds > 0)) return "the acquisition window must be positive";
+  if (config.max_tokens_per_call < 1 ||
+      config.max_tokens_per_call > audio_vesknet::VesknetDecoderParams().max_candidates_rank) {
+    return "tokens per call must be 1 to " +
+           std::to_string(audio_vesknet::VesknetDecoderParams().max_candidates_rank);
+  }
+  if (!(config.input_sample_rate >= 1000)) return "the microphone rate must be at least 1000 Hz";
+  if (config.num_channels < 1) return "the microphone needs at least one channel";
+  if (!(config.buffer_length_tokens >= 1)) return "the buffer must hold at least one token";
+  return std::string();
+}
+
+std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(const DsssDecoderConfig& config) {
+  std::unique_ptr<audio_vesknet::SymbolWaveCoder> coder = MakeSymbolWaveCoder(config.waveform);
+  audio_vesknet::VesknetDecoderParams params;
+  // Integer division first, as on the transmitting side.
+  params.symbols_in_token = (8 / config.waveform.bits_per_symbol) * config.token_length_bytes;
+  params.use_checksum_symbol = config.use_checksum_symbol;
+  params.acquisition_window_duration = config.acquisition_window_seconds;
+  params.broadcaster_threshold = config.broadcaster_threshold;
+  params.max_candidates_to_return = config.max_tokens_per_call;
+  params.design_baseband_filter = config.design_baseband_filter;
+  const double token_seconds = static_cast<double>(params.symbols_in_token) * coder->frame_size() /
+                               coder->params().sample_rate;
+  params.max_buffer_duration = static_cast<float>(token_seconds * config.buffer_length_tokens);
+  auto decoder = std::make_unique<AudioModemDecoder>(
+      std::make_unique<audio_vesknet::VesknetDecoder>(std::move(coder), params));
+  decoder->Initialize(config.input_sample_rate, config.num_channels);
+  return decoder;
+}
+
+}  // namespace audio_modem

@@ -1,0 +1,101 @@
+// The decoder object that the JNI registry holds under each decoder id: one
+// lower decoder (DSSS now; the zintar listening mode and DTMF with their own
+// units) behind one interface. Collecting tokens is where it does its own
+// work: it checks the requested token geometry, verifies and strips CRC-16
+// bytes, and builds the list of results.
+//
+// Not thread-safe: one thread at a time, like everything the JNI layer owns.
+
+#ifndef SOCIAL_TANDRY_AUDIO_AUDIO_MODEM_DECODER_H_
+#define SOCIAL_TANDRY_AUDIO_AUDIO_MODEM_DECODER_H_
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "audio/vesknet/vesknet_decoder.h"
+#include "social/tandry/audio/dsss_waveform_config.h"
+
+namespace audio_modem {
+
+// One decoded token.
+struct TokenResult {
+  std::vector<uint8_t> bytes;  // Message bytes (check bytes stripped when verified).
+  int frame_index = 0;         // Index into the frame lists of the token's first frame.
+  float score = 0.0f;          // Selector score; unspecified for CRC-verified tokens.
+};
+
+struct DecodeResults {
+  std::vector<TokenResult> tokens;  // In the order the lower decoder found them.
+  std::vector<float> frame_times;   // DSSS: seconds of the chosen group's frames.
+  std::vector<float> frame_scores;  // DSSS: their filtered acquisition scores.
+};
+
+class AudioModemDecoder {
+ public:
+  enum Kind { kDsss = 0, kZintar = 1, kDtmf = 2 };
+
+  // Takes ownership of a DSSS decoder.
+  explicit AudioModemDecoder(std::unique_ptr<audio_vesknet::VesknetDecoder> dsss_decoder);
+  ~AudioModemDecoder();
+
+  // Input at `sample_rate` Hz with `num_channels` interleaved channels.
+  void Initialize(float sample_rate, int num_channels);
+  // Interleaved samples in the 16-bit range, as floats.
+  void ProcessSamples(const std::vector<float>& samples);
+  // Raw 16-bit samples for the zintar listening mode; other kinds ignore them.
+  // The buffer may be overwritten (mixed down in place).
+  void ProcessSamplesWithZintar(int16_t* samples, int count);
+  bool DetectBroadcaster();
+  // Forgets the audio heard so far.
+  void WipeInternalData();
+  // 16-bit samples (all channels) that the next block may hold without
+  // dropping history.
+  int GetMaxSafeInputSize() const;
+
+  // Replaces the token list of *decode_results with the tokens heard, each of
+  // num_message_bytes + num_crc_check_bytes bytes (0 or 2 check bytes, which
+  // are verified and stripped). False when nothing was found, when every
+  // token failed its CRC, or, logged at ERROR, for a geometry that does not
+  // match token_size().
+  bool GetTokens(DecodeResults* decode_results, int num_message_bytes, int num_crc_check_bytes);
+
+  // Bytes per token, check bytes included.
+  int token_size() const { return token_size_; }
+  Kind kind() const { return kind_; }
+
+ private:
+  std::unique_ptr<audio_vesknet::VesknetDecoder> dsss_decoder_;
+  Kind kind_;
+  int token_size_;
+};
+
+// Everything a host chooses about a DSSS decoder, in plain values; the
+// defaults hear the product transmitter (see DsssEncoderConfig).
+struct DsssDecoderConfig {
+  int token_length_bytes = 8;  // Check bytes included, >= 1.
+  bool use_checksum_symbol = false;
+  bool design_baseband_filter = false;
+  DsssWaveformConfig waveform;  // Must match the transmitter's.
+  // Receiver settings, chosen by measurement (see the README's figures).
+  float acquisition_window_seconds = 0.75f;  // Integrated by DetectBroadcaster, > 0.
+  float broadcaster_threshold = 5.0f;        // Normalised broadcaster score.
+  int max_tokens_per_call = 2;               // 1 to 6.
+  float input_sample_rate = 44100.0f;        // Microphone rate, Hz, > 0.
+  int num_channels = 1;                      // Interleaved microphone channels, >= 1.
+  float buffer_length_tokens = 4.0f;         // History held, in token durations, > 0.
+  bool use_zintar = false;                   // Zintar listening mode in front.
+};
+
+// Empty when `config` can be built; otherwise a sentence saying what is wrong.
+std::string DsssDecoderConfigError(const DsssDecoderConfig& config);
+
+// Builds the coder, the DSSS decoder and the front object, initialised for
+// the configured input. A configuration that the lower constructors reject
+// aborts; check DsssDecoderConfigError first when it comes from a user.
+std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(const DsssDecoderConfig& config);
+
+}  // namespace audio_modem
+
+#endif  // SOCIAL_TANDRY_AUDIO_AUDIO_MODEM_DECODER_H_
