@@ -1,0 +1,156 @@
+package com.velmar.android.orv.audiomodem;
+
+/**
+ * How a receiver listens: the microphone format and the decoder's tuning. Immutable.
+ *
+ * <p>Defaults were chosen by measurement on the project's channel simulator (see the README): a
+ * 0.75 s acquisition window and a broadcaster threshold of 5 for {@link
+ * TokenDecoder#broadcasterDetected()}, a history of 4 token durations, and at most 2 tokens per
+ * {@link TokenDecoder#tokens()} call.
+ */
+public final class DecoderOptions {
+  private final int microphoneRate;
+  private final int channels;
+  private final float acquisitionWindowSeconds;
+  private final float broadcasterThreshold;
+  private final float bufferLengthTokens;
+  private final int maxTokensPerCall;
+  private final boolean designBasebandFilter;
+  private final boolean listeningMode;
+
+  private DecoderOptions(Builder b) {
+    microphoneRate = b.microphoneRate;
+    channels = b.channels;
+    acquisitionWindowSeconds = b.acquisitionWindowSeconds;
+    broadcasterThreshold = b.broadcasterThreshold;
+    bufferLengthTokens = b.bufferLengthTokens;
+    maxTokensPerCall = b.maxTokensPerCall;
+    designBasebandFilter = b.designBasebandFilter;
+    listeningMode = b.listeningMode;
+  }
+
+  public static DecoderOptions defaults() {
+    return builder().build();
+  }
+
+  public static Builder builder() {
+    return new Builder();
+  }
+
+  public int microphoneRate() {
+    return microphoneRate;
+  }
+
+  public int channels() {
+    return channels;
+  }
+
+  public float acquisitionWindowSeconds() {
+    return acquisitionWindowSeconds;
+  }
+
+  public float broadcasterThreshold() {
+    return broadcasterThreshold;
+  }
+
+  public float bufferLengthTokens() {
+    return bufferLengthTokens;
+  }
+
+  public int maxTokensPerCall() {
+    return maxTokensPerCall;
+  }
+
+  public boolean designBasebandFilter() {
+    return designBasebandFilter;
+  }
+
+  /** Whether the cheap zintar detector listens in front of the DSSS decoder. */
+  public boolean listeningMode() {
+    return listeningMode;
+  }
+
+  /** Lowest microphone rate at which the listening mode's 18496 Hz detector fits below Nyquist. */
+  public static final int MIN_LISTENING_RATE = 36994;
+
+  public static final class Builder {
+    private int microphoneRate = 44100;
+    private int channels = 1;
+    private float acquisitionWindowSeconds = 0.75f;
+    private float broadcasterThreshold = 5f;
+    private float bufferLengthTokens = 4f;
+    private int maxTokensPerCall = 2;
+    private boolean designBasebandFilter = false;
+    private boolean listeningMode = false;
+
+    private Builder() {}
+
+    /** Microphone sample rate, Hz. */
+    public Builder microphoneRate(int hertz) {
+      microphoneRate = hertz;
+      return this;
+    }
+
+    /** Interleaved microphone channels (stereo input is summed). */
+    public Builder channels(int count) {
+      channels = count;
+      return this;
+    }
+
+    public Builder acquisitionWindowSeconds(float seconds) {
+      acquisitionWindowSeconds = seconds;
+      return this;
+    }
+
+    public Builder broadcasterThreshold(float threshold) {
+      broadcasterThreshold = threshold;
+      return this;
+    }
+
+    /** History kept, in token durations. */
+    public Builder bufferLengthTokens(float tokens) {
+      bufferLengthTokens = tokens;
+      return this;
+    }
+
+    /** 1 to 6. */
+    public Builder maxTokensPerCall(int count) {
+      maxTokensPerCall = count;
+      return this;
+    }
+
+    public Builder designBasebandFilter(boolean enabled) {
+      designBasebandFilter = enabled;
+      return this;
+    }
+
+    /**
+     * Listen with the cheap zintar detector and wake the DSSS decoder only when a transmitter is
+     * heard. It hears only the product waveform ({@link DsssConfig#defaults()}: 48000 Hz coder,
+     * upsampling 16), needs a microphone rate of at least {@link #MIN_LISTENING_RATE} Hz and has
+     * no Doppler tolerance: beyond about 0.1% of relative speed (or clock skew) it stops waking.
+     */
+    public Builder listeningMode(boolean enabled) {
+      listeningMode = enabled;
+      return this;
+    }
+
+    public DecoderOptions build() {
+      require(microphoneRate >= 1000, "microphoneRate must be at least 1000 Hz");
+      require(channels >= 1, "channels must be at least 1");
+      require(acquisitionWindowSeconds > 0, "acquisitionWindowSeconds must be positive");
+      require(bufferLengthTokens >= 1, "bufferLengthTokens must be at least 1");
+      require(maxTokensPerCall >= 1 && maxTokensPerCall <= 6, "maxTokensPerCall must be 1 to 6");
+      require(
+          !listeningMode || microphoneRate >= MIN_LISTENING_RATE,
+          "the listening mode needs a microphone rate of at least " + MIN_LISTENING_RATE + " Hz");
+      return new DecoderOptions(this);
+    }
+
+    private static void require(boolean condition, String message) {
+      if (!condition) {
+        throw new IllegalArgumentException(message);
+      }
+    }
+  }
+}

@@ -1,0 +1,167 @@
+// JNI entry points of com.velmar.android.orv.audiomodem.NativeDecoder.
+//
+// Decoders live in the process-wide registry under ids that the Java side
+// chooses. Samples arrive as 16-bit PCM in direct byte buffers; tokens go
+// back through the receiver's addToken(byte[]). The entry points only
+// convert, look up and delegate. No lock guards the registry: the host must
+// not overlap an initialisation or release with any other call.
+
+#include <jni.h>
+
+#include <cstdint>
+#include <cstring>
+#include <memory>
+#include <vector>
+
+#include "base/logging.h"
+#include "location/pellam/cpp/audio/jni/decoder_registry.h"
+#include "location/pellam/cpp/audio/jni/jni_util.h"
+#include "social/tandry/audio/audio_modem_decoder.h"
+
+namespace {
+
+using audio_modem::AudioModemDecoder;
+
+// The decoder of `id`; null (logged) for an empty slot, which the host must
+// not address: such calls are ignored rather than crashing.
+AudioModemDecoder* FindDecoder(int id, const char* caller) {
+  AudioModemDecoder* decoder = vesk_jni::GlobalDecoderRegistry().Lookup(id);
+  if (decoder == nullptr) LOG(ERROR) << caller << " called for decoder id " << id << " which holds no decoder.";
+  return decoder;
+}
+
+// The checked region of a direct buffer of 16-bit samples; the checks are
+// fatal because a wrong region would read memory that is not the host's.
+const int16_t* SamplesOf(JNIEnv* env, jobject buffer, jint offset, jint length, int* count) {
+  void* const direct_buffer = env->GetDirectBufferAddress(buffer);
+  const int64_t capacity_bytes = env->GetDirectBufferCapacity(buffer);
+  const int64_t offset_bytes = offset;
+  const int64_t length_bytes = length;
+  CHECK(direct_buffer != nullptr);
+  CHECK(length_bytes % 2 == 0);
+  CHECK(length_bytes + offset_bytes <= capacity_bytes);
+  CHECK(offset_bytes >= 0);
+  CHECK(offset_bytes % 2 == 0);
+  CHECK(length_bytes >= 0);
+  *count = static_cast<int>(length_bytes / 2);
+  return reinterpret_cast<const int16_t*>(static_cast<const uint8_t*>(direct_buffer) +
+                                          offset_bytes);
+}
+
+}  // namespace
+
+extern "C" {
+
+JNIEXPORT jboolean JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDsss(
+    JNIEnv* /*env*/, jobject /*thiz*/, jint id, jint token_length_bytes,
+    jboolean use_checksum_symbol, jboolean design_baseband_filter, jint number_of_taps,
+    jint code_number, jfloat sample_rate, jint upsampling_factor, jfloat carrier_frequency,
+    jint bits_per_symbol, jint min_cycles_per_frame, jint baseband_decimation_factor,
+    jboolean use_quadrature_carrier, jfloat acquisition_window_seconds,
+    jfloat broadcaster_threshold, jint max_tokens_per_call, jfloat input_sample_rate,
+    jint num_channels, jfloat buffer_length_tokens, jboolean use_zintar) {
+  audio_modem::DsssDecoderConfig config;
+  config.token_length_bytes = token_length_bytes;
+  config.use_checksum_symbol = use_checksum_symbol;
+  config.design_baseband_filter = design_baseband_filter;
+  config.waveform.number_of_taps = number_of_taps;
+  config.waveform.code_number = code_number;
+  config.waveform.sample_rate = sample_rate;
+  config.waveform.upsampling_factor = upsampling_factor;
+  config.waveform.carrier_frequency = carrier_frequency;
+  config.waveform.bits_per_symbol = bits_per_symbol;
+  config.waveform.min_cycles_per_frame = min_cycles_per_frame;
+  config.waveform.baseband_decimation_factor = baseband_decimation_factor;
+  config.waveform.use_quadrature_carrier = use_quadrature_carrier;
+  config.acquisition_window_seconds = acquisition_window_seconds;
+  config.broadcaster_threshold = broadcaster_threshold;
+  config.max_tokens_per_call = max_tokens_per_call;
+  config.input_sample_rate = input_sample_rate;
+  config.num_channels = num_channels;
+  config.buffer_length_tokens = buffer_length_tokens;
+  config.use_zintar = use_zintar;
+  vesk_jni::GlobalDecoderRegistry().Store(id, audio_modem::MakeDsssAudioModemDecoder(config));
+  return JNI_TRUE;
+}
+
+JNIEXPORT jboolean JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDtmf(
+    JNIEnv* /*env*/, jobject /*thiz*/, jint /*id*/, jint /*bytes_in_token*/,
+    jboolean /*append_checksum_symbol*/, jfloat /*sample_rate*/,
+    jint /*baseband_decimation_factor*/, jfloat /*window_duration*/, jint /*tones_per_symbol*/,
+    jint /*ignored*/, jint /*max_tokens_per_call*/, jfloat /*input_sample_rate*/,
+    jint /*num_channels*/, jfloat /*attack_time*/, jfloat /*decay_time*/,
+    jfloat /*sustain_time*/, jfloat /*release_time*/, jfloat /*sustain_amplitude*/,
+    jfloat /*buffer_length_tokens*/, jfloatArray /*tone_frequencies*/) {
+  LOG(ERROR) << "DTMF decoding is not available in this build.";
+  return JNI_FALSE;
+}
+
+JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeProcessSamples(
+    JNIEnv* env, jobject /*thiz*/, jint id, jobject buffer, jint offset, jint length) {
+  int count = 0;
+  const int16_t* pcm = SamplesOf(env, buffer, offset, length, &count);
+  AudioModemDecoder* decoder = FindDecoder(id, "nativeProcessSamples()");
+  if (decoder == nullptr) return;
+  // 16-bit values as floats, unscaled: the decoders work in the 16-bit range.
+  std::vector<float> samples(count);
+  for (int i = 0; i < count; ++i) {
+    int16_t value;
+    std::memcpy(&value, pcm + i, sizeof(value));
+    samples[i] = value;
+  }
+  decoder->ProcessSamples(samples);
+}
+
+JNIEXPORT void JNICALL
+Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeProcessSamplesWithZintar(
+    JNIEnv* env, jobject /*thiz*/, jint id, jobject buffer, jint offset, jint length) {
+  int count = 0;
+  const int16_t* pcm = SamplesOf(env, buffer, offset, length, &count);
+  AudioModemDecoder* decoder = FindDecoder(id, "nativeProcessSamplesWithZintar()");
+  if (decoder == nullptr) return;
+  // The listening mode mixes stereo down in place, in the host's buffer.
+  decoder->ProcessSamplesWithZintar(const_cast<int16_t*>(pcm), count);
+}
+
+JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeGetTokens(
+    JNIEnv* env, jobject /*thiz*/, jint id, jobject receiver, jint num_message_bytes,
+    jint num_crc_check_bytes) {
+  jmethodID add_token = vesk_jni::FindCallback(env, receiver, "addToken", "([B)V");
+  if (add_token == nullptr) return;
+  AudioModemDecoder* decoder = FindDecoder(id, "nativeGetTokens()");
+  if (decoder == nullptr) return;
+  audio_modem::DecodeResults results;
+  if (!decoder->GetTokens(&results, num_message_bytes, num_crc_check_bytes)) return;
+  for (const audio_modem::TokenResult& token : results.tokens) {
+    jbyteArray bytes = vesk_jni::ToJavaByteArray(env, token.bytes);
+    if (bytes == nullptr) return;
+    env->CallVoidMethod(receiver, add_token, bytes);
+    env->DeleteLocalRef(bytes);
+    if (env->ExceptionCheck()) return;
+  }
+}
+
+JNIEXPORT jboolean JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeDetectBroadcaster(
+    JNIEnv* /*env*/, jobject /*thiz*/, jint id) {
+  AudioModemDecoder* decoder = FindDecoder(id, "nativeDetectBroadcaster()");
+  return decoder != nullptr && decoder->DetectBroadcaster() ? JNI_TRUE : JNI_FALSE;
+}
+
+JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeWipeInternalData(
+    JNIEnv* /*env*/, jobject /*thiz*/, jint id) {
+  AudioModemDecoder* decoder = FindDecoder(id, "nativeWipeInternalData()");
+  if (decoder != nullptr) decoder->WipeInternalData();
+}
+
+JNIEXPORT jint JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeGetMaxSafeInputSize(
+    JNIEnv* /*env*/, jobject /*thiz*/, jint id) {
+  AudioModemDecoder* decoder = FindDecoder(id, "nativeGetMaxSafeInputSize()");
+  return decoder == nullptr ? 0 : decoder->GetMaxSafeInputSize() * 2;
+}
+
+JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeRelease(
+    JNIEnv* /*env*/, jobject /*thiz*/, jint id) {
+  vesk_jni::GlobalDecoderRegistry().Release(id);
+}
+
+}  // extern "C"
