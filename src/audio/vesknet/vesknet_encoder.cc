@@ -8,13 +8,6 @@
 
 namespace audio_vesknet {
 
-int32_t ChecksumSymbol(int alphabet_size, const std::vector<int32_t>& symbols) {
-  const int32_t m = alphabet_size - 1;
-  int32_t sum = 0;
-  for (const int32_t symbol : symbols) sum += symbol;
-  return (m - sum % m) % m;
-}
-
 VesknetEncoder::VesknetEncoder(std::unique_ptr<SymbolWaveCoder> symbol_wave_coder,
                                const VesknetEncoderParams& params)
     : symbol_wave_coder_(std::move(CHECK_NOTNULL(symbol_wave_coder))), params_(params) {

@@ -17,6 +17,7 @@
 #include <vector>
 
 #include "audio/vesknet/symbol_wave_coder.h"
+#include "audio/vesknet/token_selector.h"
 #include "audio/vesknet/token_symbol_converter.h"
 
 namespace audio_vesknet {
@@ -29,11 +30,6 @@ struct VesknetEncoderParams {
   float transition_duration = 0.005f;   // Start transition, seconds, >= 0.
   float broadcast_sample_rate = 0.0f;   // Output rate, Hz; must be set > 0.
 };
-
-// The checksum symbol for data symbols in an alphabet of `alphabet_size`
-// symbols whose last one is reserved: with m = alphabet_size - 1, the value
-// (m - sum mod m) mod m, so that sum + checksum is a multiple of m.
-int32_t ChecksumSymbol(int alphabet_size, const std::vector<int32_t>& symbols);
 
 class VesknetEncoder {
  public:
