@@ -26,7 +26,8 @@ using audio_modem::AudioModemDecoder;
 // not address: such calls are ignored rather than crashing.
 AudioModemDecoder* FindDecoder(int id, const char* caller) {
   AudioModemDecoder* decoder = vesk_jni::GlobalDecoderRegistry().Lookup(id);
-  if (decoder == nullptr) LOG(ERROR) << caller << " called for decoder id " << id << " which holds no decoder.";
+  if (decoder == nullptr)
+    LOG(ERROR) << caller << " called for decoder id " << id << " which holds no decoder.";
   return decoder;
 }
 
@@ -52,7 +53,8 @@ const int16_t* SamplesOf(JNIEnv* env, jobject buffer, jint offset, jint length, 
 
 extern "C" {
 
-JNIEXPORT jboolean JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDsss(
+JNIEXPORT jboolean JNICALL
+Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDsss(
     JNIEnv* /*env*/, jobject /*thiz*/, jint id, jint token_length_bytes,
     jboolean use_checksum_symbol, jboolean design_baseband_filter, jint number_of_taps,
     jint code_number, jfloat sample_rate, jint upsampling_factor, jfloat carrier_frequency,
@@ -84,14 +86,15 @@ JNIEXPORT jboolean JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_
   return JNI_TRUE;
 }
 
-JNIEXPORT jboolean JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDtmf(
+JNIEXPORT jboolean JNICALL
+Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDtmf(
     JNIEnv* /*env*/, jobject /*thiz*/, jint /*id*/, jint /*bytes_in_token*/,
     jboolean /*append_checksum_symbol*/, jfloat /*sample_rate*/,
     jint /*baseband_decimation_factor*/, jfloat /*window_duration*/, jint /*tones_per_symbol*/,
     jint /*ignored*/, jint /*max_tokens_per_call*/, jfloat /*input_sample_rate*/,
-    jint /*num_channels*/, jfloat /*attack_time*/, jfloat /*decay_time*/,
-    jfloat /*sustain_time*/, jfloat /*release_time*/, jfloat /*sustain_amplitude*/,
-    jfloat /*buffer_length_tokens*/, jfloatArray /*tone_frequencies*/) {
+    jint /*num_channels*/, jfloat /*attack_time*/, jfloat /*decay_time*/, jfloat /*sustain_time*/,
+    jfloat /*release_time*/, jfloat /*sustain_amplitude*/, jfloat /*buffer_length_tokens*/,
+    jfloatArray /*tone_frequencies*/) {
   LOG(ERROR) << "DTMF decoding is not available in this build.";
   return JNI_FALSE;
 }
@@ -141,8 +144,10 @@ JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nati
   }
 }
 
-JNIEXPORT jboolean JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeDetectBroadcaster(
-    JNIEnv* /*env*/, jobject /*thiz*/, jint id) {
+JNIEXPORT jboolean JNICALL
+Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeDetectBroadcaster(JNIEnv* /*env*/,
+                                                                             jobject /*thiz*/,
+                                                                             jint id) {
   AudioModemDecoder* decoder = FindDecoder(id, "nativeDetectBroadcaster()");
   return decoder != nullptr && decoder->DetectBroadcaster() ? JNI_TRUE : JNI_FALSE;
 }
@@ -153,8 +158,10 @@ JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nati
   if (decoder != nullptr) decoder->WipeInternalData();
 }
 
-JNIEXPORT jint JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeGetMaxSafeInputSize(
-    JNIEnv* /*env*/, jobject /*thiz*/, jint id) {
+JNIEXPORT jint JNICALL
+Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeGetMaxSafeInputSize(JNIEnv* /*env*/,
+                                                                               jobject /*thiz*/,
+                                                                               jint id) {
   AudioModemDecoder* decoder = FindDecoder(id, "nativeGetMaxSafeInputSize()");
   return decoder == nullptr ? 0 : decoder->GetMaxSafeInputSize() * 2;
 }
