@@ -26,12 +26,6 @@ int64_t SaturatedProduct(const std::vector<int>& counts, int64_t limit) {
   return product;
 }
 
-// Non-negative remainder, so that any frame index lands in [0, period).
-int PositiveModulo(int value, int period) {
-  const int remainder = value % period;
-  return remainder < 0 ? remainder + period : remainder;
-}
-
 }  // namespace
 
 int32_t ChecksumSymbol(int alphabet_size, const std::vector<int32_t>& symbols) {
@@ -77,7 +71,7 @@ void TokenSelector::SelectTokens(const std::map<int, std::vector<float>>& candid
       frame[s] = value > 0.0f ? value : 0.0f;
       sum += frame[s];
     }
-    const int column = PositiveModulo(candidate.first, symbol_period_);
+    const int column = audio_dsp::PositiveModulo(candidate.first, symbol_period_);
     float* table_column = scores_table->col(column);
     for (int s = 0; s < alphabet_size; ++s) {
       table_column[s] += sum != 0.0f ? frame[s] / sum : frame[s];
