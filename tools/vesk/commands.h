@@ -11,6 +11,7 @@
 
 namespace vesk_tool {
 
+int RunDecode(const std::vector<std::string>& args, std::ostream& out, std::ostream& err);
 int RunEncode(const std::vector<std::string>& args, std::ostream& out, std::ostream& err);
 int RunDemo(const std::vector<std::string>& args, std::ostream& out, std::ostream& err);
 

@@ -1,53 +1,115 @@
-// vesk demo: encodes a token with the product configuration and reports the
-// audio it made.
+// vesk demo: encodes a token with the product configuration, plays it through
+// a simulated room (noise, clock skew, reverberation) into a phone
+// microphone, decodes it as an app would, and shows what happened.
 
 #include <cmath>
 #include <cstdio>
 #include <vector>
 
+#include "social/tandry/audio/audio_modem_decoder.h"
 #include "social/tandry/audio/audio_modem_encoder.h"
+#include "tools/channel/channel_simulator.h"
 #include "tools/vesk/commands.h"
 #include "tools/vesk/option_parser.h"
+#include "tools/vesk/stream_decoding.h"
 
 namespace vesk_tool {
 
 int RunDemo(const std::vector<std::string>& args, std::ostream& out, std::ostream& err) {
   std::string message_hex = "0123456789ab";
+  float snr_db = 0.0f;
+  float speed = 1.001f;
+  bool reverb = true;
+  int mic_rate = 44100;
+  int repeat = 3;
+  int seed = 1;
+  bool help = false;
   OptionParser parser;
-  parser.AddString("message", &message_hex, "message bytes in hex (6 bytes)");
+  parser.AddString("message", &message_hex, "6 message bytes in hex");
+  parser.AddFloat("snr", &snr_db, "full-band signal-to-noise ratio at the microphone, dB");
+  parser.AddFloat("speed", &speed, "clock skew or Doppler: the token plays this much faster");
+  parser.AddFlag("reverb", &reverb, "room reverberation (RT60 0.3 s)");
+  parser.AddInt("mic-rate", &mic_rate, "microphone sample rate, Hz");
+  parser.AddInt("repeat", &repeat, "token repetitions");
+  parser.AddInt("seed", &seed, "seed of the simulated room");
+  parser.AddFlag("help", &help, "show this help");
   std::string error;
   std::vector<unsigned char> message;
-  if (!parser.Parse(args, &error) || !ParseHexBytes(message_hex, &message) || message.size() != 6) {
-    err << "vesk demo: " << (error.empty() ? "--message needs 6 hex bytes" : error) << "\n"
-        << "usage: vesk demo [options]\n"
+  if (!parser.Parse(args, &error) || !ParseHexBytes(message_hex, &message) ||
+      message.size() != 6 || repeat < 1 || !(speed > 0.5f && speed < 2.0f) || mic_rate < 8000) {
+    err << "vesk demo: "
+        << (error.empty() ? "needs 6 message bytes, --repeat >= 1, --speed in (0.5, 2) and "
+                            "--mic-rate >= 8000"
+                          : error)
+        << "\nusage: vesk demo [options]\n"
         << parser.Help();
     return 2;
   }
-  const audio_modem::DsssEncoderConfig config;
-  const auto encoder = audio_modem::MakeDsssAudioModemEncoder(config);
-  std::vector<float> audio, transition;
-  encoder->Encode(std::vector<uint8_t>(message.begin(), message.end()), &audio, 2);
-  encoder->MakeStartTransition(audio, &transition);
-  float peak = 0;
-  double energy = 0;
-  for (float s : audio) {
-    peak = std::max(peak, std::fabs(s));
-    energy += static_cast<double>(s) * s;
+  if (help) {
+    out << "usage: vesk demo [options]\n" << parser.Help();
+    return 0;
   }
+
+  // Transmit.
+  const audio_modem::DsssEncoderConfig encoder_config;
+  const auto encoder = audio_modem::MakeDsssAudioModemEncoder(encoder_config);
+  std::vector<float> token_audio, transition;
+  encoder->Encode(std::vector<uint8_t>(message.begin(), message.end()), &token_audio, 2);
+  encoder->MakeStartTransition(token_audio, &transition);
+  std::vector<float> played = transition;
+  for (int r = 0; r < repeat; ++r) played.insert(played.end(), token_audio.begin(), token_audio.end());
+
+  // Through the room.
+  vesk_channel::ChannelParams room;
+  room.mic_rate = mic_rate;
+  room.speed = speed;
+  room.snr_db = snr_db;
+  room.reverb = reverb;
+  room.lead_in_s = 0.5;
+  room.max_random_lead_in_s = 0.5;
+  room.tail_s = 1.0;
+  room.seed = static_cast<uint64_t>(seed);
+  const vesk_channel::ChannelOutput heard =
+      vesk_channel::PlayThroughChannel(played, encoder->GetSampleRate(), room);
+
+  // Receive, as an app's recording loop would.
+  audio_modem::DsssDecoderConfig decoder_config;
+  decoder_config.input_sample_rate = static_cast<float>(mic_rate);
+  const auto decoder = audio_modem::MakeDsssAudioModemDecoder(decoder_config);
+  StreamDecoder stream(decoder.get(), mic_rate, 1, 6, 2, StreamDecodingOptions());
+  const std::vector<FoundToken> found =
+      stream.Feed(heard.samples.data(), static_cast<int64_t>(heard.samples.size()));
+
   char line[256];
   out << "Vesk DSSS demo\n";
   std::snprintf(line, sizeof(line),
-                "token: %s + CRC-16 (%d bytes on air), carrier %.0f Hz, %d-sample frames\n",
-                ToHex(message).c_str(), encoder->token_size(), config.waveform.carrier_frequency,
-                config.waveform.upsampling_factor * 127);
+                "sent:     %s + CRC-16, %d x %.3f s at %.0f Hz (carrier %.0f Hz, 2032-sample "
+                "frames)\n",
+                ToHex(message).c_str(), repeat, token_audio.size() / encoder->GetSampleRate(),
+                encoder->GetSampleRate(), encoder_config.waveform.carrier_frequency);
   out << line;
   std::snprintf(line, sizeof(line),
-                "audio: %zu samples at %.0f Hz (%.3f s), peak %.3f, RMS %.3f; transition %zu "
-                "samples\n",
-                audio.size(), encoder->GetSampleRate(), audio.size() / encoder->GetSampleRate(),
-                peak, std::sqrt(energy / audio.size()), transition.size());
+                "room:     SNR %.1f dB full band, speed %.4f, %s, microphone %d Hz; signal "
+                "starts at %.3f s\n",
+                snr_db, speed, reverb ? "reverberation RT60 0.3 s" : "no reverberation", mic_rate,
+                heard.signal_start_exact / mic_rate);
   out << line;
-  return 0;
+  if (stream.broadcaster_time_s() >= 0) {
+    std::snprintf(line, sizeof(line), "heard:    a transmitter at %.3f s\n",
+                  stream.broadcaster_time_s());
+    out << line;
+  }
+  bool correct = false;
+  for (const FoundToken& token : found) {
+    const bool match = token.bytes == std::vector<uint8_t>(message.begin(), message.end());
+    correct = correct || match;
+    std::snprintf(line, sizeof(line), "decoded:  %s at %.3f s%s\n",
+                  ToHex(std::vector<unsigned char>(token.bytes.begin(), token.bytes.end())).c_str(),
+                  token.time_s, match ? "  (correct)" : "  (WRONG)");
+    out << line;
+  }
+  if (found.empty()) out << "decoded:  nothing\n";
+  return correct ? 0 : 1;
 }
 
 }  // namespace vesk_tool

@@ -3,14 +3,12 @@
 namespace vesk_tool {
 
 void AddDsssOptions(OptionParser* parser, DsssOptions* options) {
-  audio_modem::DsssEncoderConfig& c = options->config;
-  audio_modem::DsssWaveformConfig& w = c.waveform;
+  audio_modem::DsssWaveformConfig& w = options->waveform;
   parser->AddString("preset", &options->preset,
                     "48k: 48000 Hz coder, upsampling 16, decimation 4 (heard by the zintar "
                     "mode); 44k: 44100 Hz, 15, 3");
   parser->AddFlag("crc", &options->crc, "two CRC-16 check bytes after the message");
-  parser->AddFlag("checksum-symbol", &c.append_checksum_symbol, "checksum symbol after the data");
-  parser->AddFlag("single-sideband", &c.single_sideband, "transmit only above the carrier");
+  parser->AddFlag("checksum-symbol", &options->checksum_symbol, "checksum symbol after the data");
   parser->AddInt("taps", &w.number_of_taps, "PN register length, 5 to 11");
   parser->AddInt("code", &w.code_number, "PN code number, 0 to 2 (5, 6 taps) or 3");
   parser->AddFloat("coder-rate", &w.sample_rate, "coder sample rate, Hz");
@@ -20,25 +18,19 @@ void AddDsssOptions(OptionParser* parser, DsssOptions* options) {
   parser->AddInt("bits", &w.bits_per_symbol, "bits per symbol: 1, 2, 4 or 8");
   parser->AddInt("cycles", &w.min_cycles_per_frame, "symbol-tone cycles per frame of symbol 0");
   parser->AddFlag("quadrature", &w.use_quadrature_carrier, "symbol tone on the cosine carrier");
-  parser->AddInt("broadcast-rate", &c.broadcast_sample_rate, "output sample rate, Hz");
-  parser->AddFloat("transition", &c.transition_duration, "start transition, seconds");
 }
 
-std::string FinishDsssOptions(const OptionParser& parser, int message_bytes, DsssOptions* options) {
-  audio_modem::DsssEncoderConfig& c = options->config;
+std::string FinishDsssOptions(const OptionParser& parser, DsssOptions* options) {
+  audio_modem::DsssWaveformConfig& w = options->waveform;
   if (options->preset == "44k") {
     const audio_modem::DsssWaveformConfig preset = audio_modem::Waveform44100();
-    if (!parser.Given("coder-rate")) c.waveform.sample_rate = preset.sample_rate;
-    if (!parser.Given("upsampling")) c.waveform.upsampling_factor = preset.upsampling_factor;
-    if (!parser.Given("decimation")) {
-      c.waveform.baseband_decimation_factor = preset.baseband_decimation_factor;
-    }
+    if (!parser.Given("coder-rate")) w.sample_rate = preset.sample_rate;
+    if (!parser.Given("upsampling")) w.upsampling_factor = preset.upsampling_factor;
+    if (!parser.Given("decimation")) w.baseband_decimation_factor = preset.baseband_decimation_factor;
   } else if (options->preset != "48k") {
     return "--preset must be 48k or 44k";
   }
-  if (message_bytes < 1) return "the message needs at least one byte";
-  c.token_length_bytes = message_bytes + (options->crc ? 2 : 0);
-  return audio_modem::DsssEncoderConfigError(c);
+  return audio_modem::DsssWaveformConfigError(w);
 }
 
 }  // namespace vesk_tool

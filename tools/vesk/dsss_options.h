@@ -1,32 +1,30 @@
-// The DSSS waveform options shared by the vesk commands.
+// The DSSS options shared by the vesk commands.
 
 #ifndef TOOLS_VESK_DSSS_OPTIONS_H_
 #define TOOLS_VESK_DSSS_OPTIONS_H_
 
 #include <string>
 
-#include "social/tandry/audio/audio_modem_encoder.h"
+#include "social/tandry/audio/dsss_waveform_config.h"
 #include "tools/vesk/option_parser.h"
 
 namespace vesk_tool {
 
-// Token and waveform settings as the user chose them. The message length and
-// the CRC setting decide the token length.
+// Token layout and waveform, as the user chose them.
 struct DsssOptions {
-  audio_modem::DsssEncoderConfig config;  // Product defaults.
-  std::string preset = "48k";             // "48k" (product) or "44k" (coder record defaults).
-  bool crc = true;                        // Two CRC-16 bytes after the message.
+  audio_modem::DsssWaveformConfig waveform;  // Product waveform.
+  std::string preset = "48k";  // "48k" (product) or "44k" (the coder record's defaults).
+  bool crc = true;             // Two CRC-16 bytes after the message.
+  bool checksum_symbol = false;
 };
 
-// Registers --preset, --crc, --checksum-symbol, --single-sideband, --taps,
-// --code, --coder-rate, --upsampling, --decimation, --carrier, --bits,
-// --cycles, --quadrature, --broadcast-rate and --transition.
+// Registers --preset, --crc, --checksum-symbol, --taps, --code, --coder-rate,
+// --upsampling, --decimation, --carrier, --bits, --cycles and --quadrature.
 void AddDsssOptions(OptionParser* parser, DsssOptions* options);
 
-// After parsing: applies the preset to the coder fields the user did not
-// set, sets the token length for `message_bytes` and validates. Returns an
-// empty string or what is wrong.
-std::string FinishDsssOptions(const OptionParser& parser, int message_bytes, DsssOptions* options);
+// After parsing: applies the preset to the coder fields that the user did
+// not set and validates the waveform. Returns an empty string or what is wrong.
+std::string FinishDsssOptions(const OptionParser& parser, DsssOptions* options);
 
 }  // namespace vesk_tool
 

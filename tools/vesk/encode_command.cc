@@ -18,10 +18,14 @@ int RunEncode(const std::vector<std::string>& args, std::ostream& out, std::ostr
   int repeat = 3;
   bool help = false;
   DsssOptions dsss;
+  audio_modem::DsssEncoderConfig config;
   OptionParser parser;
   parser.AddString("message", &message_hex, "message bytes in hex");
   parser.AddInt("repeat", &repeat, "token repetitions after the start transition");
   AddDsssOptions(&parser, &dsss);
+  parser.AddFlag("single-sideband", &config.single_sideband, "transmit only above the carrier");
+  parser.AddInt("broadcast-rate", &config.broadcast_sample_rate, "output sample rate, Hz");
+  parser.AddFloat("transition", &config.transition_duration, "start transition, seconds");
   parser.AddFlag("help", &help, "show this help");
   const std::string usage = "usage: vesk encode [options] OUTPUT.wav\n";
 
@@ -49,13 +53,17 @@ int RunEncode(const std::vector<std::string>& args, std::ostream& out, std::ostr
     err << "vesk encode: --repeat must be at least 1\n";
     return 2;
   }
-  error = FinishDsssOptions(parser, static_cast<int>(message.size()), &dsss);
+  error = FinishDsssOptions(parser, &dsss);
+  config.waveform = dsss.waveform;
+  config.append_checksum_symbol = dsss.checksum_symbol;
+  config.token_length_bytes = static_cast<int>(message.size()) + (dsss.crc ? 2 : 0);
+  if (error.empty()) error = audio_modem::DsssEncoderConfigError(config);
   if (!error.empty()) {
     err << "vesk encode: " << error << "\n";
     return 2;
   }
 
-  const auto encoder = audio_modem::MakeDsssAudioModemEncoder(dsss.config);
+  const auto encoder = audio_modem::MakeDsssAudioModemEncoder(config);
   std::vector<float> token_audio, transition;
   encoder->Encode(std::vector<uint8_t>(message.begin(), message.end()), &token_audio,
                   dsss.crc ? 2 : 0);
@@ -82,7 +90,7 @@ int RunEncode(const std::vector<std::string>& args, std::ostream& out, std::ostr
                 path.c_str(), wav.sample_rate, transition.size(), repeat, token_audio.size(),
                 static_cast<double>(wav.samples.size()) / wav.sample_rate);
   out << summary << "token: message " << ToHex(message) << (dsss.crc ? " + CRC-16" : "") << ", "
-      << dsss.config.token_length_bytes << " bytes on air\n";
+      << config.token_length_bytes << " bytes on air\n";
   return 0;
 }
 

@@ -13,6 +13,7 @@ constexpr char kUsage[] =
     "usage: vesk <command> [options]\n"
     "commands:\n"
     "  encode   write a token's audio to a WAV file\n"
+    "  decode   decode a WAV file or raw PCM from standard input\n"
     "  demo     encode a token, play it through a simulated room, decode it\n"
     "Run 'vesk <command> --help' for the options of a command.\n";
 
@@ -34,6 +35,7 @@ int main(int argc, char** argv) {
     }
   }
   if (command == "encode") return vesk_tool::RunEncode(args, std::cout, std::cerr);
+  if (command == "decode") return vesk_tool::RunDecode(args, std::cout, std::cerr);
   if (command == "demo") return vesk_tool::RunDemo(args, std::cout, std::cerr);
   if (command == "--help" || command == "help") {
     std::cout << kUsage;
