@@ -47,8 +47,9 @@ int RunDecode(const std::vector<std::string>& args, std::ostream& out, std::ostr
   parser.AddInt("tokens-per-call", &config.max_tokens_per_call, "tokens per request, 1 to 6");
   parser.AddFlag("design-filter", &config.design_baseband_filter, "designed baseband low-pass");
   parser.AddFlag("help", &help, "show this help");
-  const std::string usage = "usage: vesk decode [options] INPUT.wav\n"
-                            "       vesk decode [options] - < raw-16-bit-pcm\n";
+  const std::string usage =
+      "usage: vesk decode [options] INPUT.wav\n"
+      "       vesk decode [options] - < raw-16-bit-pcm\n";
   std::string error;
   if (!parser.Parse(args, &error)) {
     err << "vesk decode: " << error << "\n" << usage;

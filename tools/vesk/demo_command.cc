@@ -35,8 +35,8 @@ int RunDemo(const std::vector<std::string>& args, std::ostream& out, std::ostrea
   parser.AddFlag("help", &help, "show this help");
   std::string error;
   std::vector<unsigned char> message;
-  if (!parser.Parse(args, &error) || !ParseHexBytes(message_hex, &message) ||
-      message.size() != 6 || repeat < 1 || !(speed > 0.5f && speed < 2.0f) || mic_rate < 8000) {
+  if (!parser.Parse(args, &error) || !ParseHexBytes(message_hex, &message) || message.size() != 6 ||
+      repeat < 1 || !(speed > 0.5f && speed < 2.0f) || mic_rate < 8000) {
     err << "vesk demo: "
         << (error.empty() ? "needs 6 message bytes, --repeat >= 1, --speed in (0.5, 2) and "
                             "--mic-rate >= 8000"
@@ -57,7 +57,8 @@ int RunDemo(const std::vector<std::string>& args, std::ostream& out, std::ostrea
   encoder->Encode(std::vector<uint8_t>(message.begin(), message.end()), &token_audio, 2);
   encoder->MakeStartTransition(token_audio, &transition);
   std::vector<float> played = transition;
-  for (int r = 0; r < repeat; ++r) played.insert(played.end(), token_audio.begin(), token_audio.end());
+  for (int r = 0; r < repeat; ++r)
+    played.insert(played.end(), token_audio.begin(), token_audio.end());
 
   // Through the room.
   vesk_channel::ChannelParams room;

@@ -26,7 +26,8 @@ std::string FinishDsssOptions(const OptionParser& parser, DsssOptions* options) 
     const audio_modem::DsssWaveformConfig preset = audio_modem::Waveform44100();
     if (!parser.Given("coder-rate")) w.sample_rate = preset.sample_rate;
     if (!parser.Given("upsampling")) w.upsampling_factor = preset.upsampling_factor;
-    if (!parser.Given("decimation")) w.baseband_decimation_factor = preset.baseband_decimation_factor;
+    if (!parser.Given("decimation"))
+      w.baseband_decimation_factor = preset.baseband_decimation_factor;
   } else if (options->preset != "48k") {
     return "--preset must be 48k or 44k";
   }

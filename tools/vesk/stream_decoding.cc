@@ -43,11 +43,10 @@ void StreamDecoder::Request(std::vector<FoundToken>* found) {
   if (broadcaster_time_s_ < 0 && decoder_->DetectBroadcaster()) broadcaster_time_s_ = now;
   audio_modem::DecodeResults results;
   if (!decoder_->GetTokens(&results, message_bytes_, crc_check_bytes_)) return;
-  recent_.erase(std::remove_if(recent_.begin(), recent_.end(),
-                               [&](const FoundToken& t) {
-                                 return now - t.time_s > options_.repeat_hold_s;
-                               }),
-                recent_.end());
+  recent_.erase(
+      std::remove_if(recent_.begin(), recent_.end(),
+                     [&](const FoundToken& t) { return now - t.time_s > options_.repeat_hold_s; }),
+      recent_.end());
   for (const audio_modem::TokenResult& token : results.tokens) {
     // A token still heard keeps its entry fresh and is reported only once.
     auto seen = std::find_if(recent_.begin(), recent_.end(),

@@ -18,18 +18,18 @@ struct FoundToken {
 };
 
 struct StreamDecodingOptions {
-  int chunk_bytes = 4096;             // Bytes of PCM per call, as a recording loop delivers.
-  double request_interval_s = 0.25;   // Seconds between token requests.
+  int chunk_bytes = 4096;            // Bytes of PCM per call, as a recording loop delivers.
+  double request_interval_s = 0.25;  // Seconds between token requests.
   // A token is reported again only after this long without being heard.
   double repeat_hold_s = 3.0;
-  bool zintar = false;                // Feed the raw samples to the listening mode.
+  bool zintar = false;  // Feed the raw samples to the listening mode.
 };
 
 class StreamDecoder {
  public:
   // `decoder` must be initialised for `rate` and `channels` and outlive this.
-  StreamDecoder(audio_modem::AudioModemDecoder* decoder, int rate, int channels,
-                int message_bytes, int crc_check_bytes, const StreamDecodingOptions& options);
+  StreamDecoder(audio_modem::AudioModemDecoder* decoder, int rate, int channels, int message_bytes,
+                int crc_check_bytes, const StreamDecodingOptions& options);
 
   // Feeds interleaved samples (whole frames); returns the tokens first found
   // during this call.

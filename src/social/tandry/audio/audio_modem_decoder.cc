@@ -114,8 +114,13 @@ std::string DsssDecoderConfigError(const DsssDecoderConfig& config) {
 }
 
 std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(const DsssDecoderConfig& config) {
+  return MakeDsssAudioModemDecoder(config, audio_vesknet::VesknetDecoderParams());
+}
+
+std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
+    const DsssDecoderConfig& config, const audio_vesknet::VesknetDecoderParams& tuning) {
   std::unique_ptr<audio_vesknet::SymbolWaveCoder> coder = MakeSymbolWaveCoder(config.waveform);
-  audio_vesknet::VesknetDecoderParams params;
+  audio_vesknet::VesknetDecoderParams params = tuning;
   // Integer division first, as on the transmitting side.
   params.symbols_in_token = (8 / config.waveform.bits_per_symbol) * config.token_length_bytes;
   params.use_checksum_symbol = config.use_checksum_symbol;

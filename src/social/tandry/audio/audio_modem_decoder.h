@@ -96,6 +96,11 @@ std::string DsssDecoderConfigError(const DsssDecoderConfig& config);
 // aborts; check DsssDecoderConfigError first when it comes from a user.
 std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(const DsssDecoderConfig& config);
 
+// As above, with the receiver's tuning taken from `tuning` wherever `config`
+// does not set it (for measurements of the tuning itself).
+std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
+    const DsssDecoderConfig& config, const audio_vesknet::VesknetDecoderParams& tuning);
+
 }  // namespace audio_modem
 
 #endif  // SOCIAL_TANDRY_AUDIO_AUDIO_MODEM_DECODER_H_
