@@ -1,5 +1,5 @@
-// The encoder object that the JNI layer holds: one lower encoder (DSSS now,
-// DTMF with its modem) behind a token-size check and optional CRC-16 bytes.
+// The encoder object that the JNI layer holds: one lower encoder (DSSS or
+// DTMF) behind a token-size check and optional CRC-16 bytes.
 //
 // Not thread-safe: one thread at a time, like everything the JNI layer owns.
 
@@ -11,6 +11,7 @@
 #include <string>
 #include <vector>
 
+#include "audio/vesknet/dtmf/dtmf_encoder.h"
 #include "audio/vesknet/vesknet_encoder.h"
 #include "social/tandry/audio/dsss_waveform_config.h"
 
@@ -23,6 +24,10 @@ class AudioModemEncoder {
   // Takes ownership of a DSSS encoder. Token size = bits_per_symbol x
   // symbols_per_token / 8 bytes, check bytes included.
   explicit AudioModemEncoder(std::unique_ptr<audio_vesknet::VesknetEncoder> dsss_encoder);
+  // Takes ownership of a DTMF encoder. Token size = its bytes_in_token,
+  // check bytes included.
+  explicit AudioModemEncoder(std::unique_ptr<audio_vesknet::DtmfEncoder> dtmf_encoder);
+  // Destroys the DTMF encoder first, then the DSSS encoder.
   ~AudioModemEncoder();
 
   // Replaces *output with the audio of `token_bytes` followed by
@@ -33,17 +38,22 @@ class AudioModemEncoder {
               int num_crc_check_bytes) const;
 
   // Replaces *transition with the fade-in to play before `audio` (empty for
-  // an empty `audio`).
+  // an empty `audio`). A DTMF token starts and ends at silence and needs
+  // none: always empty.
   void MakeStartTransition(const std::vector<float>& audio, std::vector<float>* transition) const;
 
-  // Sample rate of the encoded audio, Hz.
+  // Sample rate of the encoded audio, Hz: the DSSS broadcast rate or the
+  // DTMF sample_rate.
   float GetSampleRate() const;
 
   int token_size() const { return token_size_; }
   Kind kind() const { return kind_; }
 
  private:
+  // Exactly one of the two is set. Declared in this order so that the DTMF
+  // encoder is destroyed first.
   std::unique_ptr<audio_vesknet::VesknetEncoder> dsss_encoder_;
+  std::unique_ptr<audio_vesknet::DtmfEncoder> dtmf_encoder_;
   Kind kind_;
   int token_size_;
 };
@@ -68,6 +78,44 @@ std::string DsssEncoderConfigError(const DsssEncoderConfig& config);
 // Symbols per token = (8 / bits_per_symbol) x token_length_bytes, the
 // division first. A configuration that the coder rejects aborts.
 std::unique_ptr<AudioModemEncoder> MakeDsssAudioModemEncoder(const DsssEncoderConfig& config);
+
+// Everything a host chooses about a DTMF encoder, in plain values; defaults
+// are the product configuration: 5-byte tokens (check bytes included) with a
+// checksum symbol (without it the receiver cannot tell wrong tokens from
+// right ones), 44100 Hz, decimation 16, 0.05 s symbols (2208 samples) of 2
+// tones from the default ten-tone set, under a 25 ms attack and 25 ms release
+// envelope.
+struct DtmfEncoderConfig {
+  int bytes_in_token = 5;  // Check bytes included, > 0.
+  bool append_checksum_symbol = true;
+  float sample_rate = 44100.0f;  // Hz.
+  int baseband_decimation_factor = 16;
+  float window_duration = 0.05f;  // Nominal symbol length, seconds.
+  int tones_per_symbol = 2;       // Must be 2 with the default tone set.
+  // Envelope: seconds, adding up to at most window_duration, and the
+  // sustain level in [0, 1].
+  float attack_time = 0.025f;
+  float decay_time = 0.0f;
+  float sustain_time = 0.0f;
+  float release_time = 0.025f;
+  float sustain_amplitude = 1.0f;
+  // Hz, each in [0, sample_rate / 2); every tones_per_symbol-combination is
+  // a symbol, the last one the spacer. Empty = the default ten-tone set.
+  std::vector<float> tone_frequencies;
+};
+
+// Empty when `config` is sound, and MakeDtmfAudioModemEncoder(config) then
+// builds an encoder; otherwise a sentence saying what is wrong: a field that
+// would abort in a check, or an envelope that would be refused (NaN or
+// infinite times included). Lets tools refuse a configuration instead of
+// aborting.
+std::string DtmfEncoderConfigError(const DtmfEncoderConfig& config);
+
+// Builds the DTMF parameter record, its envelope window, the DTMF encoder and
+// the front object from `config`. Returns null, having logged why, when the
+// envelope is refused (see audio_vesknet::SetAdsrWindow); any other invalid
+// field aborts in the encoder's checks.
+std::unique_ptr<AudioModemEncoder> MakeDtmfAudioModemEncoder(const DtmfEncoderConfig& config);
 
 }  // namespace audio_modem
 

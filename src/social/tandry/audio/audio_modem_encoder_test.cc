@@ -1,5 +1,7 @@
 #include "social/tandry/audio/audio_modem_encoder.h"
 
+#include <cmath>
+#include <limits>
 #include <vector>
 
 #include "audio/vesknet/crc16_coder.h"
@@ -83,9 +85,78 @@ TEST(AudioModemEncoderTest, ConfigErrorsAreSentencesNotAborts) {
   EXPECT_NE(DsssEncoderConfigError(config), "");
 }
 
+TEST(AudioModemEncoderTest, DtmfProductConfiguration) {
+  const auto encoder = MakeDtmfAudioModemEncoder(DtmfEncoderConfig());
+  ASSERT_NE(encoder, nullptr);
+  EXPECT_EQ(encoder->kind(), AudioModemEncoder::kDtmf);
+  EXPECT_EQ(encoder->token_size(), 5);
+  EXPECT_EQ(encoder->GetSampleRate(), 44100.0f);
+  const std::vector<uint8_t> message = {0x12, 0x34, 0x56};
+  std::vector<float> with_crc, whole_token;
+  encoder->Encode(message, &with_crc, 2);
+  EXPECT_EQ(with_crc.size(), 10u * 2208);  // Spacer, 8 symbols, checksum.
+  std::vector<uint8_t> token = message;
+  audio_vesknet::Crc16CoderParams params;
+  params.num_message_bytes = 3;
+  audio_vesknet::Crc16Coder(params).AppendCrc(&token);
+  encoder->Encode(token, &whole_token, 0);
+  EXPECT_EQ(with_crc, whole_token);
+  std::vector<float> transition = {1, 2};
+  encoder->MakeStartTransition(with_crc, &transition);
+  EXPECT_TRUE(transition.empty());
+}
+
+TEST(AudioModemEncoderTest, DtmfOwnTonesAndRefusedEnvelope) {
+  DtmfEncoderConfig config;
+  config.sample_rate = 8000;
+  config.baseband_decimation_factor = 4;
+  config.window_duration = 0.04f;  // 320 samples.
+  config.attack_time = config.release_time = 0.02f;
+  config.tones_per_symbol = 3;
+  config.tone_frequencies = {600, 900, 1300, 1800, 2400};  // 10 symbols of 3 tones.
+  config.append_checksum_symbol = false;
+  config.bytes_in_token = 2;  // 65535 needs 6 base-9 digits.
+  EXPECT_EQ(DtmfEncoderConfigError(config), "");
+  const auto encoder = MakeDtmfAudioModemEncoder(config);
+  ASSERT_NE(encoder, nullptr);
+  EXPECT_EQ(encoder->GetSampleRate(), 8000.0f);
+  std::vector<float> audio;
+  encoder->Encode({0xAB, 0xCD}, &audio, 0);
+  EXPECT_EQ(audio.size(), 7u * 320);
+
+  config.sustain_time = 0.001f;  // 0.041 s of envelope in a 0.04 s symbol.
+  EXPECT_NE(DtmfEncoderConfigError(config), "");
+  base::ScopedLogCapture capture;
+  EXPECT_EQ(MakeDtmfAudioModemEncoder(config), nullptr);
+  EXPECT_TRUE(capture.Contains(base::LogSeverity::kError,
+                               "SetAdsrWindow(): Nonzero duration 0.041 exceeds 0.04."));
+}
+
+TEST(AudioModemEncoderTest, DtmfConfigErrors) {
+  EXPECT_EQ(DtmfEncoderConfigError(DtmfEncoderConfig()), "");
+  std::vector<DtmfEncoderConfig> bad(6);
+  bad[0].window_duration = 0.0001f;  // Rounds to no decimated sample.
+  bad[1].tones_per_symbol = 3;       // The default set is paired.
+  bad[2].tone_frequencies = {500, 600, 22050};
+  bad[3].tone_frequencies = {500, 600, 700, 800, 900, 1000};
+  bad[3].tones_per_symbol = 3;  // 20 symbols, but only 15 pairs of tones.
+  bad[4].sustain_amplitude = std::nanf("");
+  bad[5].decay_time = std::numeric_limits<float>::infinity();
+  const std::vector<std::string> expected = {
+      "the symbol duration must round to between one decimated sample and 2^31 samples",
+      "the default tone set makes symbols of 2 tones",
+      "every tone must lie in [0, sample_rate / 2) Hz",
+      "there may be no more symbols than pairs of tones",
+      "the sustain amplitude must lie in [0, 1]",
+      "envelope times must be finite and non-negative"};
+  for (size_t i = 0; i < bad.size(); ++i) EXPECT_EQ(DtmfEncoderConfigError(bad[i]), expected[i]);
+}
+
 TEST(AudioModemEncoderDeathTest, NeedsAnEncoder) {
   EXPECT_DEATH(AudioModemEncoder(std::unique_ptr<audio_vesknet::VesknetEncoder>()),
                "Check failed: 'dsss_encoder' Must be non-null");
+  EXPECT_DEATH(AudioModemEncoder(std::unique_ptr<audio_vesknet::DtmfEncoder>()),
+               "Check failed: 'dtmf_encoder' Must be non-null");
 }
 
 }  // namespace

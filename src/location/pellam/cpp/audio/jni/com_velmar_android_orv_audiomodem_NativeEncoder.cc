@@ -64,15 +64,44 @@ Java_com_velmar_android_orv_audiomodem_NativeEncoder_nativeInitializeDsss(
   return JNI_TRUE;
 }
 
+// Returns false, keeping the previous encoder, when the envelope is refused
+// (logged) or a Java exception is pending after reading the tone array. An
+// empty or null tone array selects the default tone set.
 JNIEXPORT jboolean JNICALL
 Java_com_velmar_android_orv_audiomodem_NativeEncoder_nativeInitializeDtmf(
-    JNIEnv* /*env*/, jobject /*thiz*/, jint /*bytes_in_token*/, jboolean /*append_checksum_symbol*/,
-    jfloat /*sample_rate*/, jint /*baseband_decimation_factor*/, jfloat /*window_duration*/,
-    jint /*tones_per_symbol*/, jfloat /*attack_time*/, jfloat /*decay_time*/,
-    jfloat /*sustain_time*/, jfloat /*release_time*/, jfloat /*sustain_amplitude*/,
-    jfloatArray /*tone_frequencies*/) {
-  LOG(ERROR) << "DTMF encoding is not available in this build.";
-  return JNI_FALSE;
+    JNIEnv* env, jobject /*thiz*/, jint bytes_in_token, jboolean append_checksum_symbol,
+    jfloat sample_rate, jint baseband_decimation_factor, jfloat window_duration,
+    jint tones_per_symbol, jfloat attack_time, jfloat decay_time, jfloat sustain_time,
+    jfloat release_time, jfloat sustain_amplitude, jfloatArray tone_frequencies) {
+  audio_modem::DtmfEncoderConfig config;
+  config.bytes_in_token = bytes_in_token;
+  config.append_checksum_symbol = append_checksum_symbol;
+  config.sample_rate = sample_rate;
+  config.baseband_decimation_factor = baseband_decimation_factor;
+  config.window_duration = window_duration;
+  config.tones_per_symbol = tones_per_symbol;
+  config.attack_time = attack_time;
+  config.decay_time = decay_time;
+  config.sustain_time = sustain_time;
+  config.release_time = release_time;
+  config.sustain_amplitude = sustain_amplitude;
+
+  const jsize num_tones = tone_frequencies == nullptr ? 0 : env->GetArrayLength(tone_frequencies);
+  if (env->ExceptionCheck()) return JNI_FALSE;
+  if (num_tones > 0) {
+    jfloat* elements = env->GetFloatArrayElements(tone_frequencies, nullptr);
+    if (elements != nullptr) {
+      config.tone_frequencies.assign(elements, elements + num_tones);
+      env->ReleaseFloatArrayElements(tone_frequencies, elements, 0);
+    }
+    if (elements == nullptr || env->ExceptionCheck()) return JNI_FALSE;
+  }
+
+  std::unique_ptr<audio_modem::AudioModemEncoder> encoder =
+      audio_modem::MakeDtmfAudioModemEncoder(config);
+  if (!encoder) return JNI_FALSE;
+  InstallEncoder(std::move(encoder));
+  return JNI_TRUE;
 }
 
 JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeEncoder_nativeEncode(
