@@ -4,7 +4,7 @@
 // 48 kHz microphone; and false tokens from long stretches of noise and
 // babble. Both coder configurations in use are measured.
 //
-//   dsss_robustness [--seeds N] [--threads N] [--tables snr,speed,reverb,mic48,false]
+//   dsss_robustness [--seeds N] [--threads N] [--tables snr,speed,reverb,mic48,false,tune]
 //                   [--coder 44k|48k|both] [--set name=value ...]
 //
 // --set overrides a decoder tuning field (see dsss_trial.cc), for measuring
@@ -30,6 +30,7 @@ struct Options {
   std::string tables = "snr,speed,reverb,mic48,false";
   std::string coder = "both";
   double false_minutes = 10.0;
+  std::string label = "defaults";  // Row label of the tune table.
   audio_vesknet::VesknetDecoderParams tuning;
 };
 
@@ -131,6 +132,60 @@ void FalseTokens(const Options& options) {
   }
 }
 
+// One summary row for comparing tunings: successes (of 2 x seeds, both
+// coders) at the points where the tuning matters, and false tokens from
+// unchecked noise.
+void TuneRow(const Options& options, const std::string& label) {
+  struct Case {
+    const char* name;
+    double snr;
+    double speed;
+    bool reverb;
+  };
+  const Case cases[] = {{"-19dB", -19, 1.0, false},       {"-18dB", -18, 1.0, false},
+                        {"-17dB", -17, 1.0, false},       {"-16dB", -16, 1.0, false},
+                        {"0.997@-10", -10, 0.997, false}, {"1.003@-10", -10, 1.003, false},
+                        {"rev@-15", -15, 1.0, true}};
+  static bool header = false;
+  if (!header) {
+    std::printf("| tuning |");
+    for (const Case& c : cases) std::printf(" %s |", c.name);
+    std::printf(" wrong | false (3 min, no CRC) |\n|---|");
+    for (size_t i = 0; i < sizeof(cases) / sizeof(cases[0]) + 2; ++i) std::printf("---|");
+    std::printf("\n");
+    header = true;
+  }
+  std::printf("| %s |", label.c_str());
+  int wrong = 0;
+  for (const Case& c : cases) {
+    int successes = 0;
+    for (const Coder& coder : Coders(options)) {
+      DsssTrial trial;
+      trial.waveform = coder.waveform;
+      trial.tuning = options.tuning;
+      trial.channel = DefaultTrialChannel();
+      trial.channel.snr_db = c.snr;
+      trial.channel.speed = c.speed;
+      trial.channel.reverb = c.reverb;
+      const Point p = RunPoint(trial, options);
+      successes += p.successes;
+      wrong += p.wrong;
+    }
+    std::printf(" %d |", successes);
+    std::fflush(stdout);
+  }
+  int false_tokens = 0;
+  for (const Coder& coder : Coders(options)) {
+    DsssTrial trial;
+    trial.waveform = coder.waveform;
+    trial.tuning = options.tuning;
+    trial.channel = DefaultTrialChannel();
+    trial.crc = false;
+    false_tokens += CountFalseTokens(trial, 180.0, false, 99);
+  }
+  std::printf(" %d | %d |\n", wrong, false_tokens);
+}
+
 bool Has(const Options& options, const char* table) {
   return ("," + options.tables + ",").find(std::string(",") + table + ",") != std::string::npos;
 }
@@ -155,6 +210,7 @@ int main(int argc, char** argv) {
     } else if (arg == "--false-minutes") {
       options.false_minutes = std::atof(value), ++i;
     } else if (arg == "--set" && vesk_bench::SetTuning(value, &options.tuning)) {
+      options.label = options.label == "defaults" ? value : options.label + " " + value;
       ++i;
     } else {
       std::fprintf(stderr,
@@ -194,5 +250,6 @@ int main(int argc, char** argv) {
                       });
   }
   if (vesk_bench::Has(options, "false")) vesk_bench::FalseTokens(options);
+  if (vesk_bench::Has(options, "tune")) vesk_bench::TuneRow(options, options.label);
   return 0;
 }

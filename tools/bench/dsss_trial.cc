@@ -30,6 +30,7 @@ std::unique_ptr<audio_modem::AudioModemDecoder> MakeDecoder(const DsssTrial& tri
 vesk_tool::StreamDecodingOptions StreamOptions(const DsssTrial& trial) {
   vesk_tool::StreamDecodingOptions options;
   options.zintar = trial.zintar;
+  options.chunk_bytes = trial.chunk_bytes;
   return options;
 }
 

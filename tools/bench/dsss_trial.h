@@ -22,7 +22,8 @@ struct DsssTrial {
   int repeat = 3;                              // Token repetitions played.
   bool crc = true;                             // 6 + 2 bytes, or 8 bytes unchecked.
   bool checksum_symbol = false;
-  bool zintar = false;  // Listen through the zintar mode.
+  bool zintar = false;     // Listen through the zintar mode.
+  int chunk_bytes = 4096;  // PCM bytes per decoder call.
 };
 
 struct TrialResult {

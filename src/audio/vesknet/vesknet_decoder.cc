@@ -118,9 +118,9 @@ void VesknetDecoder::Initialize(float sample_rate, int num_channels) {
   received_history_.Clear();
   baseband_filter_->Reset();
   const audio_dsp::DefaultResamplingKernel kernel(sample_rate, baseband_rate_);
-  resampler_ =
+  baseband_resampler_ =
       std::make_unique<audio_dsp::RationalFactorResampler<std::complex<float>>>(kernel, 2000);
-  CHECK(resampler_->Valid()) << "Failed to initialize RationalFactorResampler.";
+  CHECK(baseband_resampler_->Valid()) << "Failed to initialize RationalFactorResampler.";
 
   baseband_real_.Clear();
   baseband_imag_.Clear();
@@ -191,7 +191,7 @@ void VesknetDecoder::ProcessSamples(const std::vector<float>& received_samples) 
     phasor *= mixing_increment_;
   }
   mixing_phasor_ = phasor / std::abs(phasor);
-  resampler_->ProcessSamples(mixed_, &resampled_);
+  baseband_resampler_->ProcessSamples(mixed_, &resampled_);
   baseband_filter_->ProcessSamples(resampled_, &filtered_);
   new_real_.resize(filtered_.size());
   new_imag_.resize(filtered_.size());

@@ -188,7 +188,7 @@ class VesknetDecoder {
   StreamBuffer<float> received_history_;
   std::complex<double> mixing_phasor_;
   std::complex<double> mixing_increment_;
-  std::unique_ptr<audio_dsp::RationalFactorResampler<std::complex<float>>> resampler_;
+  std::unique_ptr<audio_dsp::RationalFactorResampler<std::complex<float>>> baseband_resampler_;
   StreamBuffer<float> baseband_real_;
   StreamBuffer<float> baseband_imag_;
   StreamBuffer<float> scores_;

@@ -15,27 +15,42 @@ AudioModemDecoder::AudioModemDecoder(std::unique_ptr<audio_vesknet::VesknetDecod
                 dsss_decoder_->params().symbols_in_token / 8;
 }
 
+AudioModemDecoder::AudioModemDecoder(std::unique_ptr<ZintarDecoder> zintar_decoder)
+    : zintar_decoder_(std::move(CHECK_NOTNULL(zintar_decoder))), kind_(kZintar) {
+  token_size_ = zintar_decoder_->token_size();
+}
+
 AudioModemDecoder::~AudioModemDecoder() = default;
 
 void AudioModemDecoder::Initialize(float sample_rate, int num_channels) {
   if (kind_ == kDsss) dsss_decoder_->Initialize(sample_rate, num_channels);
+  if (kind_ == kZintar) zintar_decoder_->Initialize(sample_rate, num_channels);
 }
 
 void AudioModemDecoder::ProcessSamples(const std::vector<float>& samples) {
   if (kind_ == kDsss) dsss_decoder_->ProcessSamples(samples);
+  if (kind_ == kZintar) {
+    // The values came from 16-bit samples: truncation restores them.
+    raw_.resize(samples.size());
+    for (size_t i = 0; i < samples.size(); ++i) raw_[i] = static_cast<int16_t>(samples[i]);
+    zintar_decoder_->ProcessSamples(raw_.data(), static_cast<int>(raw_.size()));
+  }
 }
 
-void AudioModemDecoder::ProcessSamplesWithZintar(int16_t* /*samples*/, int /*count*/) {
+void AudioModemDecoder::ProcessSamplesWithZintar(int16_t* samples, int count) {
   // Only the zintar kind listens to raw samples.
+  if (kind_ == kZintar) zintar_decoder_->ProcessSamples(samples, count);
 }
 
 bool AudioModemDecoder::DetectBroadcaster() {
   if (kind_ == kDsss) return dsss_decoder_->DetectBroadcaster();
+  if (kind_ == kZintar) return zintar_decoder_->DetectBroadcaster();
   return false;
 }
 
 void AudioModemDecoder::WipeInternalData() {
   if (kind_ == kDsss) dsss_decoder_->WipeInternalData();
+  if (kind_ == kZintar) zintar_decoder_->WipeInternalData();
 }
 
 int AudioModemDecoder::GetMaxSafeInputSize() const {
@@ -43,6 +58,7 @@ int AudioModemDecoder::GetMaxSafeInputSize() const {
     const int frames = dsss_decoder_->max_buffer_size() - dsss_decoder_->buffered_input_frames();
     return std::max(0, frames) * dsss_decoder_->num_channels();
   }
+  if (kind_ == kZintar) return zintar_decoder_->GetMaxSafeInputSize();
   return 0;
 }
 
@@ -64,9 +80,11 @@ bool AudioModemDecoder::GetTokens(DecodeResults* decode_results, int num_message
   decode_results->tokens.clear();
 
   DecodeResults raw;
-  if (kind_ == kDsss) {
+  if (kind_ == kDsss || kind_ == kZintar) {
     audio_vesknet::VesknetDecodeResults dsss_results;
-    if (!dsss_decoder_->GetToken(&dsss_results)) return false;
+    const bool found = kind_ == kDsss ? dsss_decoder_->GetToken(&dsss_results)
+                                      : zintar_decoder_->GetToken(&dsss_results);
+    if (!found) return false;
     for (audio_vesknet::TokenCandidate& candidate : dsss_results.token_candidates) {
       raw.tokens.push_back({std::move(candidate.bytes), candidate.start_index, candidate.score});
     }
@@ -110,6 +128,9 @@ std::string DsssDecoderConfigError(const DsssDecoderConfig& config) {
   if (!(config.input_sample_rate >= 1000)) return "the microphone rate must be at least 1000 Hz";
   if (config.num_channels < 1) return "the microphone needs at least one channel";
   if (!(config.buffer_length_tokens >= 1)) return "the buffer must hold at least one token";
+  if (config.use_zintar && ZintarDetectorHolder::Create(config.input_sample_rate, 1) == nullptr) {
+    return "the zintar listening mode needs a microphone rate of at least 36994 Hz";
+  }
   return std::string();
 }
 
@@ -131,8 +152,17 @@ std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
   const double token_seconds = static_cast<double>(params.symbols_in_token) * coder->frame_size() /
                                coder->params().sample_rate;
   params.max_buffer_duration = static_cast<float>(token_seconds * config.buffer_length_tokens);
-  auto decoder = std::make_unique<AudioModemDecoder>(
-      std::make_unique<audio_vesknet::VesknetDecoder>(std::move(coder), params));
+  auto dsss_decoder = std::make_unique<audio_vesknet::VesknetDecoder>(std::move(coder), params);
+  std::unique_ptr<AudioModemDecoder> decoder;
+  if (config.use_zintar) {
+    // A detector that cannot be made (the rate is too low) ends the process
+    // in the zintar decoder's check.
+    decoder = std::make_unique<AudioModemDecoder>(std::make_unique<ZintarDecoder>(
+        std::move(dsss_decoder),
+        ZintarDetectorHolder::Create(config.input_sample_rate, config.num_channels)));
+  } else {
+    decoder = std::make_unique<AudioModemDecoder>(std::move(dsss_decoder));
+  }
   decoder->Initialize(config.input_sample_rate, config.num_channels);
   return decoder;
 }

@@ -1,6 +1,6 @@
 // The decoder object that the JNI registry holds under each decoder id: one
-// lower decoder (DSSS now; the zintar listening mode and DTMF with their own
-// units) behind one interface. Collecting tokens is where it does its own
+// lower decoder (DSSS, DSSS behind the zintar listening mode, or DTMF) behind
+// one interface. Collecting tokens is where it does its own
 // work: it checks the requested token geometry, verifies and strips CRC-16
 // bytes, and builds the list of results.
 //
@@ -16,6 +16,7 @@
 
 #include "audio/vesknet/vesknet_decoder.h"
 #include "social/tandry/audio/dsss_waveform_config.h"
+#include "social/tandry/audio/zintar_decoder.h"
 
 namespace audio_modem {
 
@@ -38,11 +39,14 @@ class AudioModemDecoder {
 
   // Takes ownership of a DSSS decoder.
   explicit AudioModemDecoder(std::unique_ptr<audio_vesknet::VesknetDecoder> dsss_decoder);
+  // Takes ownership of a DSSS decoder behind the zintar listening mode.
+  explicit AudioModemDecoder(std::unique_ptr<ZintarDecoder> zintar_decoder);
   ~AudioModemDecoder();
 
   // Input at `sample_rate` Hz with `num_channels` interleaved channels.
   void Initialize(float sample_rate, int num_channels);
-  // Interleaved samples in the 16-bit range, as floats.
+  // Interleaved samples in the 16-bit range, as floats (the zintar kind
+  // truncates them back to 16-bit values).
   void ProcessSamples(const std::vector<float>& samples);
   // Raw 16-bit samples for the zintar listening mode; other kinds ignore them.
   // The buffer may be overwritten (mixed down in place).
@@ -67,7 +71,9 @@ class AudioModemDecoder {
 
  private:
   std::unique_ptr<audio_vesknet::VesknetDecoder> dsss_decoder_;
+  std::unique_ptr<ZintarDecoder> zintar_decoder_;
   Kind kind_;
+  std::vector<int16_t> raw_;  // Scratch for the zintar kind.
   int token_size_;
 };
 
@@ -85,7 +91,9 @@ struct DsssDecoderConfig {
   float input_sample_rate = 44100.0f;        // Microphone rate, Hz, > 0.
   int num_channels = 1;                      // Interleaved microphone channels, >= 1.
   float buffer_length_tokens = 4.0f;         // History held, in token durations, > 0.
-  bool use_zintar = false;                   // Zintar listening mode in front.
+  // The zintar listening mode in front: a cheap detector wakes the decoder
+  // (see ZintarDecoder for what it hears). Needs input_sample_rate >= 36994.
+  bool use_zintar = false;
 };
 
 // Empty when `config` can be built; otherwise a sentence saying what is wrong.
