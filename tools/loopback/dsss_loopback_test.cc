@@ -82,5 +82,19 @@ TEST(DsssLoopbackTest, NoiseAloneNeverYieldsAToken) {
   }
 }
 
+// The listening mode wakes on the product waveform and hands the decoder
+// enough history to decode the token.
+TEST(DsssLoopbackTest, ZintarModeDecodesTheProductToken) {
+  DsssTrial trial = Trial(10);
+  trial.channel.mic_rate = 48000;
+  trial.zintar = true;
+  int wrong = 0;
+  EXPECT_GE(Successes(trial, 20, &wrong), 18);
+  EXPECT_EQ(wrong, 0);
+  // Through a 44.1 kHz microphone too (the detector works from 36994 Hz).
+  trial.channel.mic_rate = 44100;
+  EXPECT_GE(Successes(trial, 5, &wrong), 4);
+}
+
 }  // namespace
 }  // namespace vesk_bench

@@ -78,6 +78,23 @@ class TokenDecoderTest {
   }
 
   @Test
+  void listeningModeWakesOnTheProductToken() {
+    DsssConfig config = DsssConfig.defaults();
+    DecoderOptions options =
+        DecoderOptions.builder().microphoneRate(48000).channels(2).listeningMode(true).build();
+    try (TokenDecoder decoder = TokenDecoder.create(config, options)) {
+      short[] quiet = new short[2 * 48000];
+      decoder.process(quiet);
+      assertTrue(decoder.tokens().isEmpty());
+      assertFalse(decoder.broadcasterDetected()); // Still listening: nothing woke it.
+      decoder.process(transmission(config, MESSAGE, 2, 6));
+      List<byte[]> tokens = decoder.tokens();
+      assertFalse(tokens.isEmpty());
+      assertArrayEquals(MESSAGE, tokens.get(0));
+    }
+  }
+
+  @Test
   void noiseGivesNoToken() {
     try (TokenDecoder decoder =
         TokenDecoder.create(DsssConfig.defaults(), DecoderOptions.defaults())) {
