@@ -4,7 +4,7 @@
 // 48 kHz microphone; and false tokens from long stretches of noise and
 // babble. Both coder configurations in use are measured.
 //
-//   dsss_robustness [--seeds N] [--threads N] [--tables snr,speed,reverb,mic48,false,tune]
+//   dsss_robustness [--seeds N] [--threads N] [--tables snr,speed,reverb,mic48,false,tune,host]
 //                   [--coder 44k|48k|both] [--set name=value ...]
 //
 // --set overrides a decoder tuning field (see dsss_trial.cc), for measuring
@@ -186,6 +186,82 @@ void TuneRow(const Options& options, const std::string& label) {
   std::printf(" %d | %d |\n", wrong, false_tokens);
 }
 
+// The settings a host passes: the broadcaster detection's threshold and
+// window (detected within the transmission at low SNR, versus the share of
+// positive answers in noise), and the history length in tokens.
+void HostTables(const Options& options) {
+  std::printf(
+      "\n### DetectBroadcaster: transmissions detected (of %d, both coders) and the "
+      "share of positive answers in 3 minutes of noise\n\n",
+      2 * options.seeds);
+  std::printf(
+      "| window s | threshold | detected at -15 dB | at -10 dB | median delay at -10 dB s "
+      "| noise answers positive |\n|---|---|---|---|---|---|\n");
+  for (float window : {0.5f, 0.75f, 1.0f}) {
+    for (float threshold : {3.0f, 4.0f, 5.0f, 6.0f, 8.0f}) {
+      std::printf("| %g | %g |", window, threshold);
+      std::vector<double> delays;
+      for (double snr : {-15.0, -10.0}) {
+        int detected = 0;
+        for (const Coder& coder : Coders(options)) {
+          DsssTrial trial;
+          trial.waveform = coder.waveform;
+          trial.tuning = options.tuning;
+          trial.tuning.acquisition_window_duration = window;
+          trial.tuning.broadcaster_threshold = threshold;
+          trial.channel = DefaultTrialChannel();
+          trial.channel.snr_db = snr;
+          for (int seed = 1; seed <= options.seeds; ++seed) {
+            const TrialResult r = RunDsssTrial(trial, seed);
+            // Detected while the transmission lasts (about 2.2 s).
+            if (r.heard_delay_s >= 0 && r.heard_delay_s < 2.5) {
+              ++detected;
+              if (snr == -10.0) delays.push_back(r.heard_delay_s);
+            }
+          }
+        }
+        std::printf(" %d |", detected);
+      }
+      double noise_share = 0, share = 0;
+      for (const Coder& coder : Coders(options)) {
+        DsssTrial trial;
+        trial.waveform = coder.waveform;
+        trial.tuning = options.tuning;
+        trial.tuning.acquisition_window_duration = window;
+        trial.tuning.broadcaster_threshold = threshold;
+        trial.channel = DefaultTrialChannel();
+        CountFalseTokens(trial, 180.0, false, 31, &share);
+        noise_share += share / Coders(options).size();
+      }
+      std::printf(" %.2f | %.4f |\n", Median(delays), noise_share);
+      std::fflush(stdout);
+    }
+  }
+  std::printf("\n### History length (successes of %d, both coders)\n\n| buffer tokens |",
+              2 * options.seeds);
+  const double snrs[] = {-19, -18, -17, -15};
+  for (double snr : snrs) std::printf(" %g dB |", snr);
+  std::printf("\n|---|---|---|---|---|\n");
+  for (float tokens : {2.0f, 3.0f, 4.0f, 6.0f}) {
+    std::printf("| %g |", tokens);
+    for (double snr : snrs) {
+      int successes = 0;
+      for (const Coder& coder : Coders(options)) {
+        DsssTrial trial;
+        trial.waveform = coder.waveform;
+        trial.tuning = options.tuning;
+        trial.channel = DefaultTrialChannel();
+        trial.channel.snr_db = snr;
+        trial.buffer_length_tokens = tokens;
+        successes += RunPoint(trial, options).successes;
+      }
+      std::printf(" %d |", successes);
+      std::fflush(stdout);
+    }
+    std::printf("\n");
+  }
+}
+
 bool Has(const Options& options, const char* table) {
   return ("," + options.tables + ",").find(std::string(",") + table + ",") != std::string::npos;
 }
@@ -251,5 +327,6 @@ int main(int argc, char** argv) {
   }
   if (vesk_bench::Has(options, "false")) vesk_bench::FalseTokens(options);
   if (vesk_bench::Has(options, "tune")) vesk_bench::TuneRow(options, options.label);
+  if (vesk_bench::Has(options, "host")) vesk_bench::HostTables(options);
   return 0;
 }

@@ -24,6 +24,7 @@ std::unique_ptr<audio_modem::AudioModemDecoder> MakeDecoder(const DsssTrial& tri
   config.max_tokens_per_call = trial.tuning.max_candidates_to_return;
   config.acquisition_window_seconds = trial.tuning.acquisition_window_duration;
   config.broadcaster_threshold = trial.tuning.broadcaster_threshold;
+  config.buffer_length_tokens = trial.buffer_length_tokens;
   return audio_modem::MakeDsssAudioModemDecoder(config, trial.tuning);
 }
 
@@ -84,7 +85,8 @@ TrialResult RunDsssTrial(const DsssTrial& trial, uint64_t seed) {
   return result;
 }
 
-int CountFalseTokens(const DsssTrial& trial, double seconds, bool babble, uint64_t seed) {
+int CountFalseTokens(const DsssTrial& trial, double seconds, bool babble, uint64_t seed,
+                     double* detections) {
   const int rate = trial.channel.mic_rate;
   // Noise at a moderate level, or babble at a conversational one; an hour of
   // audio is generated in pieces to bound memory.
@@ -98,14 +100,19 @@ int CountFalseTokens(const DsssTrial& trial, double seconds, bool babble, uint64
     std::vector<int16_t> samples;
     if (babble) {
       const std::vector<float> speech = vesk_channel::MakeBabble(piece_s, rate, 4, piece_seed);
-      for (float s : speech)
+      for (float s : speech) {
         samples.push_back(
             static_cast<int16_t>(std::max(-32768.0f, std::min(32767.0f, 3000.0f * s))));
+      }
     } else {
       samples = vesk_channel::MakeNoise(piece_s, rate, 1000.0, piece_seed);
     }
     found +=
         static_cast<int>(stream.Feed(samples.data(), static_cast<int64_t>(samples.size())).size());
+  }
+  if (detections != nullptr) {
+    *detections = static_cast<double>(stream.positive_broadcaster_answers()) /
+                  std::max(1, stream.broadcaster_answers());
   }
   return found;
 }

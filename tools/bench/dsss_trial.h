@@ -22,8 +22,9 @@ struct DsssTrial {
   int repeat = 3;                              // Token repetitions played.
   bool crc = true;                             // 6 + 2 bytes, or 8 bytes unchecked.
   bool checksum_symbol = false;
-  bool zintar = false;     // Listen through the zintar mode.
-  int chunk_bytes = 4096;  // PCM bytes per decoder call.
+  bool zintar = false;                // Listen through the zintar mode.
+  int chunk_bytes = 4096;             // PCM bytes per decoder call.
+  float buffer_length_tokens = 4.0f;  // Decoder history, in token durations.
 };
 
 struct TrialResult {
@@ -40,8 +41,10 @@ vesk_channel::ChannelParams DefaultTrialChannel();
 TrialResult RunDsssTrial(const DsssTrial& trial, uint64_t seed);
 
 // Tokens reported from `seconds` of noise only (or `babble`), with the same
-// decoding loop: every one is a false token.
-int CountFalseTokens(const DsssTrial& trial, double seconds, bool babble, uint64_t seed);
+// decoding loop: every one is a false token. When `detections` is not null it
+// receives the fraction of DetectBroadcaster answers that were positive.
+int CountFalseTokens(const DsssTrial& trial, double seconds, bool babble, uint64_t seed,
+                     double* detections = nullptr);
 
 // Applies "name=value" to the tuning; false for an unknown name or bad value.
 bool SetTuning(const std::string& assignment, audio_vesknet::VesknetDecoderParams* tuning);

@@ -46,6 +46,9 @@ int RunDecode(const std::vector<std::string>& args, std::ostream& out, std::ostr
   parser.AddFloat("buffer-tokens", &config.buffer_length_tokens, "history, in token durations");
   parser.AddInt("tokens-per-call", &config.max_tokens_per_call, "tokens per request, 1 to 6");
   parser.AddFlag("design-filter", &config.design_baseband_filter, "designed baseband low-pass");
+  parser.AddFlag("zintar", &config.use_zintar,
+                 "zintar listening mode: hears only the 48k preset, needs >= 36994 Hz input, no "
+                 "Doppler tolerance beyond about 0.1%");
   parser.AddFlag("help", &help, "show this help");
   const std::string usage =
       "usage: vesk decode [options] INPUT.wav\n"
@@ -87,6 +90,7 @@ int RunDecode(const std::vector<std::string>& args, std::ostream& out, std::ostr
     return 2;
   }
   const auto decoder = audio_modem::MakeDsssAudioModemDecoder(config);
+  stream.zintar = config.use_zintar;
   StreamDecoder stream_decoder(decoder.get(), rate, channels, message_bytes, dsss.crc ? 2 : 0,
                                stream);
   int found = 0;

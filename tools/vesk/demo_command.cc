@@ -23,6 +23,7 @@ int RunDemo(const std::vector<std::string>& args, std::ostream& out, std::ostrea
   int mic_rate = 44100;
   int repeat = 3;
   int seed = 1;
+  bool zintar = false;
   bool help = false;
   OptionParser parser;
   parser.AddString("message", &message_hex, "6 message bytes in hex");
@@ -32,6 +33,7 @@ int RunDemo(const std::vector<std::string>& args, std::ostream& out, std::ostrea
   parser.AddInt("mic-rate", &mic_rate, "microphone sample rate, Hz");
   parser.AddInt("repeat", &repeat, "token repetitions");
   parser.AddInt("seed", &seed, "seed of the simulated room");
+  parser.AddFlag("zintar", &zintar, "decode through the zintar listening mode");
   parser.AddFlag("help", &help, "show this help");
   std::string error;
   std::vector<unsigned char> message;
@@ -48,6 +50,14 @@ int RunDemo(const std::vector<std::string>& args, std::ostream& out, std::ostrea
   if (help) {
     out << "usage: vesk demo [options]\n" << parser.Help();
     return 0;
+  }
+  audio_modem::DsssDecoderConfig decoder_config;
+  decoder_config.input_sample_rate = static_cast<float>(mic_rate);
+  decoder_config.use_zintar = zintar;
+  error = audio_modem::DsssDecoderConfigError(decoder_config);
+  if (!error.empty()) {
+    err << "vesk demo: " << error << "\n";
+    return 2;
   }
 
   // Transmit.
@@ -74,10 +84,10 @@ int RunDemo(const std::vector<std::string>& args, std::ostream& out, std::ostrea
       vesk_channel::PlayThroughChannel(played, encoder->GetSampleRate(), room);
 
   // Receive, as an app's recording loop would.
-  audio_modem::DsssDecoderConfig decoder_config;
-  decoder_config.input_sample_rate = static_cast<float>(mic_rate);
   const auto decoder = audio_modem::MakeDsssAudioModemDecoder(decoder_config);
-  StreamDecoder stream(decoder.get(), mic_rate, 1, 6, 2, StreamDecodingOptions());
+  StreamDecodingOptions stream_options;
+  stream_options.zintar = zintar;
+  StreamDecoder stream(decoder.get(), mic_rate, 1, 6, 2, stream_options);
   const std::vector<FoundToken> found =
       stream.Feed(heard.samples.data(), static_cast<int64_t>(heard.samples.size()));
 
@@ -90,10 +100,10 @@ int RunDemo(const std::vector<std::string>& args, std::ostream& out, std::ostrea
                 encoder->GetSampleRate(), encoder_config.waveform.carrier_frequency);
   out << line;
   std::snprintf(line, sizeof(line),
-                "room:     SNR %.1f dB full band, speed %.4f, %s, microphone %d Hz; signal "
+                "room:     SNR %.1f dB full band, speed %.4f, %s, microphone %d Hz%s; signal "
                 "starts at %.3f s\n",
                 snr_db, speed, reverb ? "reverberation RT60 0.3 s" : "no reverberation", mic_rate,
-                heard.signal_start_exact / mic_rate);
+                zintar ? " (listening mode)" : "", heard.signal_start_exact / mic_rate);
   out << line;
   if (stream.broadcaster_time_s() >= 0) {
     std::snprintf(line, sizeof(line), "heard:    a transmitter at %.3f s\n",

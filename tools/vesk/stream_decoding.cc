@@ -40,7 +40,12 @@ std::vector<FoundToken> StreamDecoder::Feed(const int16_t* samples, int64_t coun
 
 void StreamDecoder::Request(std::vector<FoundToken>* found) {
   const double now = time_s();
-  if (broadcaster_time_s_ < 0 && decoder_->DetectBroadcaster()) broadcaster_time_s_ = now;
+  const bool broadcaster = decoder_->DetectBroadcaster();
+  ++broadcaster_answers_;
+  if (broadcaster) {
+    ++positive_broadcaster_answers_;
+    if (broadcaster_time_s_ < 0) broadcaster_time_s_ = now;
+  }
   audio_modem::DecodeResults results;
   if (!decoder_->GetTokens(&results, message_bytes_, crc_check_bytes_)) return;
   recent_.erase(

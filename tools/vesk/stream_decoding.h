@@ -39,6 +39,9 @@ class StreamDecoder {
   double time_s() const { return static_cast<double>(frames_fed_) / rate_; }
   // Stream time of the first positive DetectBroadcaster answer, or -1.
   double broadcaster_time_s() const { return broadcaster_time_s_; }
+  // DetectBroadcaster answers so far (one per request) and the positive ones.
+  int broadcaster_answers() const { return broadcaster_answers_; }
+  int positive_broadcaster_answers() const { return positive_broadcaster_answers_; }
 
  private:
   void Request(std::vector<FoundToken>* found);
@@ -52,6 +55,8 @@ class StreamDecoder {
   int64_t frames_fed_ = 0;
   int64_t next_request_frame_;
   double broadcaster_time_s_ = -1.0;
+  int broadcaster_answers_ = 0;
+  int positive_broadcaster_answers_ = 0;
   std::vector<FoundToken> recent_;  // Reported tokens and when last heard.
   std::vector<float> floats_;
   std::vector<int16_t> raw_;
