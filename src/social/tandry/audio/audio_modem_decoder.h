@@ -84,13 +84,20 @@ struct DsssDecoderConfig {
   bool use_checksum_symbol = false;
   bool design_baseband_filter = false;
   DsssWaveformConfig waveform;  // Must match the transmitter's.
-  // Receiver settings, chosen by measurement (see the README's figures).
-  float acquisition_window_seconds = 0.75f;  // Integrated by DetectBroadcaster, > 0.
+  // Receiver settings, measured with tools/bench/dsss_robustness --tables host.
+  // A 0.75 s window with threshold 5 detects every transmission down to
+  // -15 dB within 0.15 s and never answers true in noise (threshold 3, or 4
+  // with a 1 s window, does).
+  float acquisition_window_seconds = 0.75f;  // > 0.
   float broadcaster_threshold = 5.0f;        // Normalised broadcaster score.
-  int max_tokens_per_call = 2;               // 1 to 6.
-  float input_sample_rate = 44100.0f;        // Microphone rate, Hz, > 0.
-  int num_channels = 1;                      // Interleaved microphone channels, >= 1.
-  float buffer_length_tokens = 4.0f;         // History held, in token durations, > 0.
+  // 1 to 6. Two let a second candidate pass the CRC when the best one fails;
+  // without a CRC the second is usually wrong, so unchecked hosts ask for 1.
+  int max_tokens_per_call = 2;
+  float input_sample_rate = 44100.0f;  // Microphone rate, Hz, > 0.
+  int num_channels = 1;                // Interleaved microphone channels, >= 1.
+  // History held, in token durations, >= 1: 3 or more integrate a repeated
+  // token equally (2 loses about 1 dB); 4 leaves room for a host that asks late.
+  float buffer_length_tokens = 4.0f;
   // The zintar listening mode in front: a cheap detector wakes the decoder
   // (see ZintarDecoder for what it hears). Needs input_sample_rate >= 36994.
   bool use_zintar = false;
