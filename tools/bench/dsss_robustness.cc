@@ -4,7 +4,8 @@
 // 48 kHz microphone; and false tokens from long stretches of noise and
 // babble. Both coder configurations in use are measured.
 //
-//   dsss_robustness [--seeds N] [--threads N] [--tables snr,speed,reverb,mic48,false,tune,host]
+//   dsss_robustness [--seeds N] [--threads N] [--tables
+//   snr,speed,reverb,mic48,unchecked,false,tune,host]
 //                   [--coder 44k|48k|both] [--set name=value ...]
 //
 // --set overrides a decoder tuning field (see dsss_trial.cc), for measuring
@@ -323,6 +324,23 @@ int main(int argc, char** argv) {
                       options, [](double v, DsssTrial* t) {
                         t->channel.snr_db = v;
                         t->channel.mic_rate = 48000;
+                      });
+  }
+  if (vesk_bench::Has(options, "unchecked")) {
+    // What the CRC buys: without a check a token heard only in part, or
+    // under noise, also comes out wrong.
+    vesk_bench::Sweep("Without CRC: 8 unchecked bytes, one token per call", "SNR dB",
+                      {10, 0, -10, -15}, options, [](double v, DsssTrial* t) {
+                        t->channel.snr_db = v;
+                        t->crc = false;
+                        t->tuning.max_candidates_to_return = 1;
+                      });
+    vesk_bench::Sweep("Without CRC, with the checksum symbol", "SNR dB", {10, 0, -10, -15}, options,
+                      [](double v, DsssTrial* t) {
+                        t->channel.snr_db = v;
+                        t->crc = false;
+                        t->checksum_symbol = true;
+                        t->tuning.max_candidates_to_return = 1;
                       });
   }
   if (vesk_bench::Has(options, "false")) vesk_bench::FalseTokens(options);
