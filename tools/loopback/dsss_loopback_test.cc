@@ -53,7 +53,9 @@ TEST(DsssLoopbackTest, CleanAudioAlwaysDecodes) {
           // Without a check a token heard only in part can come out wrong as
           // well (dsss_robustness --tables unchecked): only the CRC rules
           // that out.
-          if (crc) EXPECT_EQ(result.wrong, 0);
+          if (crc) {
+            EXPECT_EQ(result.wrong, 0);
+          }
         }
       }
     }
