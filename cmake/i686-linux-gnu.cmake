@@ -17,3 +17,6 @@ set(CMAKE_FIND_ROOT_PATH /usr/lib/i386-linux-gnu)
 set(CMAKE_IGNORE_PATH /usr/lib/x86_64-linux-gnu /usr/lib/x86_64-linux-gnu/android
                       /usr/lib/x86_64-linux-gnu/cmake)
 set(CMAKE_PREFIX_PATH /usr/lib/i386-linux-gnu/cmake)
+# pkg-config must see the i386 packages only (a package missing there, such as
+# libsndfile, then leaves its tool out instead of linking the wrong ABI).
+set(ENV{PKG_CONFIG_LIBDIR} "/usr/lib/i386-linux-gnu/pkgconfig:/usr/share/pkgconfig")
