@@ -48,6 +48,9 @@ class GammaFilter {
 
   // Clears the state of every stage, as after construction.
   void Reset() { state_.assign(state_.size(), 0.0f); }
+  // Sets every stage to `value`: the state after a long steady input of
+  // `value`, so that a stream starting near it does not ramp up from zero.
+  void Reset(float value) { state_.assign(state_.size(), value); }
 
  private:
   double sample_rate_;

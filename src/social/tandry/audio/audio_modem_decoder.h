@@ -1,6 +1,6 @@
 // The decoder object that the JNI registry holds under each decoder id: one
-// lower decoder (DSSS now; the zintar listening mode and DTMF with their own
-// units) behind one interface. Collecting tokens is where it does its own
+// lower decoder (DSSS or DTMF; the zintar listening mode with its own unit)
+// behind one interface. Collecting tokens is where it does its own
 // work: it checks the requested token geometry, verifies and strips CRC-16
 // bytes, and builds the list of results.
 //
@@ -14,8 +14,10 @@
 #include <string>
 #include <vector>
 
+#include "audio/vesknet/dtmf/dtmf_decoder.h"
 #include "audio/vesknet/vesknet_decoder.h"
 #include "social/tandry/audio/dsss_waveform_config.h"
+#include "social/tandry/audio/dtmf_waveform_config.h"
 
 namespace audio_modem {
 
@@ -28,8 +30,8 @@ struct TokenResult {
 
 struct DecodeResults {
   std::vector<TokenResult> tokens;  // In the order the lower decoder found them.
-  std::vector<float> frame_times;   // DSSS: seconds of the chosen group's frames.
-  std::vector<float> frame_scores;  // DSSS: their filtered acquisition scores.
+  std::vector<float> frame_times;   // DSSS: seconds of the chosen group's frames; DTMF: empty.
+  std::vector<float> frame_scores;  // DSSS: their filtered acquisition scores; DTMF: empty.
 };
 
 class AudioModemDecoder {
@@ -38,6 +40,8 @@ class AudioModemDecoder {
 
   // Takes ownership of a DSSS decoder.
   explicit AudioModemDecoder(std::unique_ptr<audio_vesknet::VesknetDecoder> dsss_decoder);
+  // Takes ownership of a DTMF decoder; token size = its bytes_in_token.
+  explicit AudioModemDecoder(std::unique_ptr<audio_vesknet::DtmfDecoder> dtmf_decoder);
   ~AudioModemDecoder();
 
   // Input at `sample_rate` Hz with `num_channels` interleaved channels.
@@ -47,6 +51,7 @@ class AudioModemDecoder {
   // Raw 16-bit samples for the zintar listening mode; other kinds ignore them.
   // The buffer may be overwritten (mixed down in place).
   void ProcessSamplesWithZintar(int16_t* samples, int count);
+  // DSSS: whether a transmitter is audible; DTMF: always false.
   bool DetectBroadcaster();
   // Forgets the audio heard so far.
   void WipeInternalData();
@@ -66,7 +71,9 @@ class AudioModemDecoder {
   Kind kind() const { return kind_; }
 
  private:
+  // Exactly one is set.
   std::unique_ptr<audio_vesknet::VesknetDecoder> dsss_decoder_;
+  std::unique_ptr<audio_vesknet::DtmfDecoder> dtmf_decoder_;
   Kind kind_;
   int token_size_;
 };
@@ -100,6 +107,34 @@ std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(const DsssDecoderCo
 // does not set it (for measurements of the tuning itself).
 std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
     const DsssDecoderConfig& config, const audio_vesknet::VesknetDecoderParams& tuning);
+
+// Everything a host chooses about a DTMF decoder, in plain values: the
+// waveform, which must match the transmitter's (the defaults hear the
+// product transmitter, see DtmfWaveformConfig), and the microphone.
+struct DtmfDecoderConfig : DtmfWaveformConfig {
+  int max_tokens_per_call = 2;         // 1 to 6.
+  float input_sample_rate = 44100.0f;  // Microphone rate, Hz, > 0.
+  int num_channels = 1;                // Interleaved microphone channels, >= 1.
+  // History held, in token durations, 1 to 100. Four: three repetitions of a
+  // token and the one being received.
+  float buffer_length_tokens = 4.0f;
+};
+
+// Empty when `config` can be built; otherwise a sentence saying what is wrong.
+std::string DtmfDecoderConfigError(const DtmfDecoderConfig& config);
+
+// Builds the DTMF parameter record, the DTMF decoder and the front object,
+// initialised for the configured input. Returns null, having logged why, when
+// the envelope is refused (see audio_vesknet::SetAdsrWindow); any other
+// invalid field aborts in the decoder's checks (check DtmfDecoderConfigError
+// first when the configuration comes from a user).
+std::unique_ptr<AudioModemDecoder> MakeDtmfAudioModemDecoder(const DtmfDecoderConfig& config);
+
+// As above, with the receiver's tuning (the fields after the transmitter's
+// record) taken from `tuning` wherever `config` does not set it (for
+// measurements of the tuning itself).
+std::unique_ptr<AudioModemDecoder> MakeDtmfAudioModemDecoder(
+    const DtmfDecoderConfig& config, const audio_vesknet::DtmfDecoderParams& tuning);
 
 }  // namespace audio_modem
 
