@@ -20,7 +20,7 @@ namespace audio_dsp {
 
 // Writes the running maximum of input[0 .. num_samples) over windows of
 // `window_size` (>= 1) samples to output[0 .. num_samples). T needs only
-// operator>=. input and output must not overlap (not in-place).
+// operator<. input and output must not overlap (not in-place).
 //
 // Cost is about three comparisons per sample whatever the width (van Herk /
 // Gil-Werman: maxima from the start and from the end of each block of
@@ -34,7 +34,8 @@ void MaxFilter(const T* input, int num_samples, int window_size, T* output) {
   if (num_samples == 0) return;
   CHECK(input);
   CHECK(output);
-  auto max = [](T a, T b) { return a >= b ? a : b; };
+  // std::max's form, which compilers turn into a single max instruction.
+  auto max = [](T a, T b) { return a < b ? b : a; };
   const int n = num_samples;
   const int w = window_size;
 
@@ -80,11 +81,11 @@ void MaxFilter(const T* input, int num_samples, int window_size, T* output) {
     output[k] = max(suffix[k - first_full], output[k + h]);
   }
   const T last_prefix = output[n - 1];
-  const int64_t last_block = (n - 1) / w;
+  const int64_t last_block_start = (n - 1) / w * w;
   for (int64_t k = std::max(first_full, last_full + 1); k < n; ++k) {
     // Clipped at the end: from a to the last sample.
     const int64_t a = k - first_full;
-    output[k] = a / w == last_block ? suffix[a] : max(suffix[a], last_prefix);
+    output[k] = a >= last_block_start ? suffix[a] : max(suffix[a], last_prefix);
   }
 }
 

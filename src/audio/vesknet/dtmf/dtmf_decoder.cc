@@ -214,6 +214,20 @@ void DtmfDecoder::FeedMono(const std::vector<float>& mono) {
 
 void DtmfDecoder::NormalizeToneStrengths(audio_dsp::MatrixXf* tone_scores) {
   CHECK(tone_scores);
+  NormalizeToRows();
+  const int n = tone_strength_buffer_size_;
+  // Every element is written below; resize only zero-fills on a new shape.
+  if (tone_scores->rows() != num_frequencies_ || tone_scores->cols() != n) {
+    tone_scores->resize(num_frequencies_, n);
+  }
+  for (int t = 0; t < n; ++t) {
+    float* column = tone_scores->col(t);
+    for (int i = 0; i < num_frequencies_; ++i)
+      column[i] = normalized_[static_cast<size_t>(i) * n + t];
+  }
+}
+
+void DtmfDecoder::NormalizeToRows() {
   const int n = tone_strength_buffer_size_;
   const DtmfDecoderParams::ToneNormalizationParams& normalization =
       params_.tone_normalization_params;
@@ -223,39 +237,28 @@ void DtmfDecoder::NormalizeToneStrengths(audio_dsp::MatrixXf* tone_scores) {
                                   static_cast<double>(normalization.window_size));
   const int window = static_cast<int>(std::max(1.0, std::min(width, double{1 << 30})));
 
-  local_max_.resize(static_cast<size_t>(num_frequencies_) * n);
+  normalized_.resize(static_cast<size_t>(num_frequencies_) * n);
   for (int i = 0; i < num_frequencies_; ++i) {
     audio_dsp::MaxFilter(tone_strength_buffers_[i].data(), n, window,
-                         local_max_.data() + static_cast<size_t>(i) * n);
+                         normalized_.data() + static_cast<size_t>(i) * n);
   }
 
   // m: the strongest tone's running maximum at each time.
-  column_max_.assign(local_max_.begin(), local_max_.begin() + n);
+  column_max_.assign(normalized_.begin(), normalized_.begin() + n);
   for (int i = 1; i < num_frequencies_; ++i) {
-    const float* x = local_max_.data() + static_cast<size_t>(i) * n;
+    const float* x = normalized_.data() + static_cast<size_t>(i) * n;
 #pragma omp simd
     for (int t = 0; t < n; ++t) column_max_[t] = std::max(column_max_[t], x[t]);
   }
-  // Normalised in place of the running maxima, tone by tone (vectorisable),
-  // then stored time by time.
+  // In place of the running maxima, tone by tone (vectorisable).
   const float weight = normalization.cross_frequency_weight;
   const float floor = normalization.division_floor;
   const float* m = column_max_.data();
   for (int i = 0; i < num_frequencies_; ++i) {
-    float* x = local_max_.data() + static_cast<size_t>(i) * n;
+    float* x = normalized_.data() + static_cast<size_t>(i) * n;
     const float* s = tone_strength_buffers_[i].data();
 #pragma omp simd
     for (int t = 0; t < n; ++t) x[t] = s[t] / ((m[t] - x[t]) * weight + x[t] + floor);
-  }
-  // Every element is written below; resize only zero-fills on a new shape.
-  if (tone_scores->rows() != num_frequencies_ || tone_scores->cols() != n) {
-    tone_scores->resize(num_frequencies_, n);
-  }
-  for (int t = 0; t < n; ++t) {
-    float* column = tone_scores->col(t);
-    for (int i = 0; i < num_frequencies_; ++i) {
-      column[i] = local_max_[static_cast<size_t>(i) * n + t];
-    }
   }
 }
 
@@ -264,6 +267,17 @@ void DtmfDecoder::ComputeAcquisitionScores(const audio_dsp::MatrixXf& tone_score
   CHECK(tone_scores.rows() == num_frequencies_);
   CHECK(tone_scores.cols() == tone_strength_buffer_size_);
   CHECK(acquisition_scores);
+  const int n = tone_strength_buffer_size_;
+  // Tone-major copy, in one sequential pass over the columns.
+  rows_.resize(static_cast<size_t>(num_frequencies_) * n);
+  for (int t = 0; t < n; ++t) {
+    const float* column = tone_scores.col(t);
+    for (int i = 0; i < num_frequencies_; ++i) rows_[static_cast<size_t>(i) * n + t] = column[i];
+  }
+  ScoreToneRows(rows_.data(), acquisition_scores);
+}
+
+void DtmfDecoder::ScoreToneRows(const float* rows, std::vector<float>* acquisition_scores) {
   const int n = tone_strength_buffer_size_;
   // Position of the tones_per_symbol-th largest value; the k below it are the
   // noise.
@@ -274,17 +288,13 @@ void DtmfDecoder::ComputeAcquisitionScores(const audio_dsp::MatrixXf& tone_score
   // bubbles through the top_count largest so far (largest first); what falls
   // out of the last place is one of the k values below position k of the
   // ascending order, and goes to the noise sum.
-  // Tone-major copy first, in one sequential pass over the columns.
-  rows_.resize(static_cast<size_t>(num_frequencies_) * n);
-  for (int t = 0; t < n; ++t) {
-    const float* column = tone_scores.col(t);
-    for (int i = 0; i < num_frequencies_; ++i) rows_[static_cast<size_t>(i) * n + t] = column[i];
-  }
   top_.assign(static_cast<size_t>(top_count) * n, -std::numeric_limits<float>::infinity());
   noise_.assign(n, 0.0f);
   float* __restrict noise_sum = noise_.data();
+  moving_.resize(n);
+  float* __restrict moving = moving_.data();
   for (int i = 0; i < num_frequencies_; ++i) {
-    float* __restrict moving = rows_.data() + static_cast<size_t>(i) * n;
+    std::copy(rows + static_cast<size_t>(i) * n, rows + static_cast<size_t>(i + 1) * n, moving);
     for (int j = 0; j < top_count; ++j) {
       float* __restrict kept = top_.data() + static_cast<size_t>(j) * n;
 #pragma omp simd
@@ -368,6 +378,15 @@ void DtmfDecoder::FindCandidates(const audio_dsp::MatrixXf& tone_scores,
   CHECK(tone_scores.cols() == tone_strength_buffer_size_);
   CHECK(acquisition_scores.size() == tone_strength_buffer_size_);
   CHECK(candidates);
+  FindCandidatesIn(
+      [&tone_scores](int tone, int64_t t) { return tone_scores(tone, static_cast<int>(t)); },
+      acquisition_scores, start, candidates);
+}
+
+template <typename ToneScore>
+void DtmfDecoder::FindCandidatesIn(ToneScore tone_score,
+                                   const std::vector<float>& acquisition_scores, int start,
+                                   std::map<int, std::vector<float>>* candidates) const {
   candidates->clear();
   const int64_t n = tone_strength_buffer_size_;
   const int64_t period = samples_per_symbol_;
@@ -384,11 +403,10 @@ void DtmfDecoder::FindCandidates(const audio_dsp::MatrixXf& tone_scores,
     // token period) lines up with whole symbols.
     std::vector<float>& scores = (*candidates)[static_cast<int>(t / period)];
     scores.resize(symbol_table.size());
-    const float* column = tone_scores.col(static_cast<int>(t));
     for (size_t s = 0; s < symbol_table.size(); ++s) {
       // A symbol is as strong as its weakest tone.
       float weakest = std::numeric_limits<float>::infinity();
-      for (const int32_t tone : symbol_table[s]) weakest = std::min(weakest, column[tone]);
+      for (const int32_t tone : symbol_table[s]) weakest = std::min(weakest, tone_score(tone, t));
       scores[s] = weakest;
     }
   }
@@ -400,11 +418,17 @@ std::vector<DtmfDecodedToken> DtmfDecoder::GetToken() {
     LOG(ERROR) << "GetToken() called before call to Init().";
     return tokens;
   }
-  NormalizeToneStrengths(&tone_scores_);
-  ComputeAcquisitionScores(tone_scores_, &acquisition_scores_);
+  // The steps of NormalizeToneStrengths, ComputeAcquisitionScores and
+  // FindCandidates, on the normalised strengths as they come, tone after tone
+  // (the public steps lay them out time after time, which costs two copies).
+  NormalizeToRows();
+  ScoreToneRows(normalized_.data(), &acquisition_scores_);
   const int start = ComputeStartOffset(acquisition_scores_);
+  const size_t n = static_cast<size_t>(tone_strength_buffer_size_);
+  const float* normalized = normalized_.data();
   std::map<int, std::vector<float>> candidates;
-  FindCandidates(tone_scores_, acquisition_scores_, start, &candidates);
+  FindCandidatesIn([normalized, n](int tone, int64_t t) { return normalized[tone * n + t]; },
+                   acquisition_scores_, start, &candidates);
   // Fewer candidates than one token period cannot cover every position.
   if (static_cast<int>(candidates.size()) < token_selector_.symbol_period()) return tokens;
 

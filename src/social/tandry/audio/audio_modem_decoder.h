@@ -112,7 +112,7 @@ std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
 // waveform, which must match the transmitter's (the defaults hear the
 // product transmitter, see DtmfWaveformConfig), and the microphone.
 struct DtmfDecoderConfig : DtmfWaveformConfig {
-  int max_tokens_per_call = 2;         // 1 to 6.
+  int max_tokens_per_call = 2;         // 1 to 3.
   float input_sample_rate = 44100.0f;  // Microphone rate, Hz, > 0.
   int num_channels = 1;                // Interleaved microphone channels, >= 1.
   // History held, in token durations, 1 to 100. Four: three repetitions of a
