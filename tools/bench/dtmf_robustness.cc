@@ -7,6 +7,7 @@
 // and the 10/10/20/10 ms ADSR with a half-level sustain.
 //
 //   dtmf_robustness [--seeds N] [--threads N] [--repeat N] [--false-minutes M]
+//                   [--speed-snr DB]
 //                   [--tables snr,speed,reverb,babble,mic48,stereo,false]
 //                   [--windows product,halfsine,adsr] [--set name=value ...]
 //
@@ -34,7 +35,8 @@ struct Options {
   std::string tables = "snr,speed,reverb,babble,mic48,stereo,false";
   std::string windows = "product,halfsine";
   double false_minutes = 10.0;
-  DtmfTrial base;  // Tuning and receiver overrides.
+  double speed_snr_db = -10.0;  // SNR of the speed table.
+  DtmfTrial base;               // Tuning and receiver overrides.
 };
 
 struct Point {
@@ -153,12 +155,15 @@ int main(int argc, char** argv) {
       options.windows = value, ++i;
     } else if (arg == "--false-minutes") {
       options.false_minutes = std::atof(value), ++i;
+    } else if (arg == "--speed-snr") {
+      options.speed_snr_db = std::atof(value), ++i;
     } else if (arg == "--set" && vesk_bench::SetDtmfTuning(value, &options.base)) {
       ++i;
     } else {
       std::fprintf(stderr,
                    "usage: %s [--seeds N] [--threads N] [--repeat N] [--tables LIST] "
-                   "[--windows product,halfsine,adsr] [--false-minutes M] [--set name=value]\n",
+                   "[--windows product,halfsine,adsr] [--false-minutes M] [--speed-snr DB] "
+                   "[--set name=value]\n",
                    argv[0]);
       return 2;
     }
@@ -172,11 +177,13 @@ int main(int argc, char** argv) {
                       [](double v, DtmfTrial* t) { t->channel.snr_db = v; });
   }
   if (vesk_bench::Has(tables, "speed")) {
-    vesk_bench::Sweep("Success versus speed (clock skew or Doppler) at -10 dB SNR", "speed",
-                      {0.997, 0.998, 0.999, 1.0, 1.001, 1.002, 1.003}, options,
-                      [](double v, DtmfTrial* t) {
+    const std::string title = "Success versus speed (clock skew or Doppler) at " +
+                              std::to_string(static_cast<int>(options.speed_snr_db)) + " dB SNR";
+    const double snr_db = options.speed_snr_db;
+    vesk_bench::Sweep(title.c_str(), "speed", {0.997, 0.998, 0.999, 1.0, 1.001, 1.002, 1.003},
+                      options, [snr_db](double v, DtmfTrial* t) {
                         t->channel.speed = v;
-                        t->channel.snr_db = -10;
+                        t->channel.snr_db = snr_db;
                       });
   }
   if (vesk_bench::Has(tables, "reverb")) {

@@ -26,14 +26,29 @@ namespace audio_dsp {
 // Gil-Werman: maxima from the start and from the end of each block of
 // window_size samples; a window meets at most two blocks). The suffix
 // maxima live in one scratch array of num_samples values, allocated per
-// call; the prefix maxima are built in `output` itself.
+// call (see the overload below to reuse it); the prefix maxima are built in
+// `output` itself.
+template <typename T>
+void MaxFilter(const T* input, int num_samples, int window_size, T* output,
+               std::vector<T>* scratch);
+
 template <typename T>
 void MaxFilter(const T* input, int num_samples, int window_size, T* output) {
+  std::vector<T> scratch;
+  MaxFilter(input, num_samples, window_size, output, &scratch);
+}
+
+// The same with the suffix maxima in *scratch (resized to num_samples), for
+// callers that run the filter often and keep their buffers.
+template <typename T>
+void MaxFilter(const T* input, int num_samples, int window_size, T* output,
+               std::vector<T>* scratch) {
   CHECK(num_samples >= 0);
   CHECK(window_size >= 1);
   if (num_samples == 0) return;
   CHECK(input);
   CHECK(output);
+  CHECK(scratch);
   // std::max's form, which compilers turn into a single max instruction.
   auto max = [](T a, T b) { return a < b ? b : a; };
   const int n = num_samples;
@@ -41,7 +56,8 @@ void MaxFilter(const T* input, int num_samples, int window_size, T* output) {
 
   // prefix (in output): maximum from the block's start to i; suffix: from i
   // to the block's end (or the input's end).
-  std::vector<T> suffix(n);
+  scratch->resize(n);
+  T* const suffix = scratch->data();
   const int64_t full_blocks = n / w;
   for (int64_t b = 0; b < full_blocks; ++b) {
     output[b * w] = input[b * w];

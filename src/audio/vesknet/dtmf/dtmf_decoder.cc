@@ -240,7 +240,7 @@ void DtmfDecoder::NormalizeToRows() {
   normalized_.resize(static_cast<size_t>(num_frequencies_) * n);
   for (int i = 0; i < num_frequencies_; ++i) {
     audio_dsp::MaxFilter(tone_strength_buffers_[i].data(), n, window,
-                         normalized_.data() + static_cast<size_t>(i) * n);
+                         normalized_.data() + static_cast<size_t>(i) * n, &max_filter_scratch_);
   }
 
   // m: the strongest tone's running maximum at each time.
