@@ -161,9 +161,8 @@ std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
 std::string DtmfDecoderConfigError(const DtmfDecoderConfig& config) {
   const std::string waveform_error = DtmfWaveformConfigError(config);
   if (!waveform_error.empty()) return waveform_error;
-  const int max_rank = audio_vesknet::DtmfDecoderParams().max_candidates_rank;
-  if (config.max_tokens_per_call < 1 || config.max_tokens_per_call > max_rank) {
-    return "tokens per call must be 1 to " + std::to_string(max_rank);
+  if (config.max_tokens_per_call < 1 || config.max_tokens_per_call > kMaxDtmfTokensPerCall) {
+    return "tokens per call must be 1 to " + std::to_string(kMaxDtmfTokensPerCall);
   }
   if (!(config.input_sample_rate >= 1000)) return "the microphone rate must be at least 1000 Hz";
   // The resampler approximates the rate ratio by a fraction of denominator
@@ -190,6 +189,9 @@ std::unique_ptr<AudioModemDecoder> MakeDtmfAudioModemDecoder(
   audio_vesknet::DtmfDecoderParams params = tuning;
   static_cast<audio_vesknet::DtmfEncoderParams&>(params) = waveform;
   params.max_candidates_per_decode_token_call = config.max_tokens_per_call;
+  // Hosts may ask for more tokens per call than the rank checks sequences:
+  // the rank grows to match instead of failing the token selector's check.
+  params.max_candidates_rank = std::max(params.max_candidates_rank, config.max_tokens_per_call);
   params.max_buffer_duration_in_seconds =
       config.buffer_length_tokens * audio_vesknet::GetTokenDurationSeconds(params);
   auto decoder =

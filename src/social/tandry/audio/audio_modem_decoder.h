@@ -108,11 +108,16 @@ std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(const DsssDecoderCo
 std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
     const DsssDecoderConfig& config, const audio_vesknet::VesknetDecoderParams& tuning);
 
+// Tokens per call a DTMF decoder configuration may ask for, as for DSSS.
+constexpr int kMaxDtmfTokensPerCall = 6;
+
 // Everything a host chooses about a DTMF decoder, in plain values: the
 // waveform, which must match the transmitter's (the defaults hear the
 // product transmitter, see DtmfWaveformConfig), and the microphone.
 struct DtmfDecoderConfig : DtmfWaveformConfig {
-  int max_tokens_per_call = 2;         // 1 to 3.
+  // 1 to kMaxDtmfTokensPerCall; above the tuning's max_candidates_rank (3 by
+  // default) the rank is raised to match.
+  int max_tokens_per_call = 2;
   float input_sample_rate = 44100.0f;  // Microphone rate, Hz, > 0.
   int num_channels = 1;                // Interleaved microphone channels, >= 1.
   // History held, in token durations, 1 to 100. Four: three repetitions of a

@@ -98,13 +98,13 @@ TEST(AudioModemDecoderTest, DtmfMaxSafeInputSizeCountsAllChannels) {
 TEST(AudioModemDecoderTest, DtmfFactoryRefusalsAndTuning) {
   EXPECT_EQ(DtmfDecoderConfigError(DtmfDecoderConfig()), "");
   std::vector<DtmfDecoderConfig> bad(5);
-  bad[0].max_tokens_per_call = 4;
+  bad[0].max_tokens_per_call = 7;
   bad[1].input_sample_rate = 500;
   bad[2].num_channels = 0;
   bad[3].buffer_length_tokens = 0.5f;
   bad[4].tones_per_symbol = 3;
   const std::vector<std::string> expected = {
-      "tokens per call must be 1 to 3", "the microphone rate must be at least 1000 Hz",
+      "tokens per call must be 1 to 6", "the microphone rate must be at least 1000 Hz",
       "the microphone needs at least one channel", "the buffer must hold 1 to 100 tokens",
       "the default tone set makes symbols of 2 tones"};
   for (size_t i = 0; i < bad.size(); ++i) EXPECT_EQ(DtmfDecoderConfigError(bad[i]), expected[i]);
@@ -115,6 +115,14 @@ TEST(AudioModemDecoderTest, DtmfFactoryRefusalsAndTuning) {
   base::ScopedLogCapture capture;
   EXPECT_EQ(MakeDtmfAudioModemDecoder(config), nullptr);
   EXPECT_TRUE(capture.Contains(base::LogSeverity::kError, "SetAdsrWindow(): Nonzero duration"));
+
+  // More tokens per call than the default rank: the rank follows.
+  config = DtmfDecoderConfig();
+  config.max_tokens_per_call = 6;
+  const auto six = MakeDtmfAudioModemDecoder(config);
+  six->ProcessSamples(DtmfAudio({1, 2, 3, 4, 5}, 0));
+  DecodeResults six_results;
+  EXPECT_TRUE(six->GetTokens(&six_results, 5, 0));
 
   // The tuning reaches the decoder: an unreachable threshold hears nothing.
   audio_vesknet::DtmfDecoderParams tuning;
