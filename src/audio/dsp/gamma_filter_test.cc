@@ -30,6 +30,10 @@ TEST(GammaFilterTest, ImpulseResponseHasUnitGainAndRequestedWidth) {
   EXPECT_EQ(filter.Delay(), std::lround(mean));
   filter.Reset();
   EXPECT_NEAR(filter.Step(1.0f), std::pow(1.0 - filter.decay(), 3), 1e-6);
+  // Reset to a value: that value passes unchanged, as after a steady input.
+  filter.Reset(2.5f);
+  EXPECT_FLOAT_EQ(filter.Step(2.5f), 2.5f);
+  EXPECT_LT(filter.Step(0.0f), 2.5f);
 }
 
 }  // namespace

@@ -20,45 +20,88 @@ namespace audio_dsp {
 
 // Writes the running maximum of input[0 .. num_samples) over windows of
 // `window_size` (>= 1) samples to output[0 .. num_samples). T needs only
-// operator>=. input and output must not overlap (not in-place).
+// operator<. input and output must not overlap (not in-place).
 //
-// Cost is amortised constant per sample (a monotone queue of indices). The
-// queue lives in one scratch array of min(window_size, num_samples) ints,
-// allocated per call; nothing else is allocated.
+// Cost is about three comparisons per sample whatever the width (van Herk /
+// Gil-Werman: maxima from the start and from the end of each block of
+// window_size samples; a window meets at most two blocks). The suffix
+// maxima live in one scratch array of num_samples values, allocated per
+// call (see the overload below to reuse it); the prefix maxima are built in
+// `output` itself.
+template <typename T>
+void MaxFilter(const T* input, int num_samples, int window_size, T* output,
+               std::vector<T>* scratch);
+
 template <typename T>
 void MaxFilter(const T* input, int num_samples, int window_size, T* output) {
+  std::vector<T> scratch;
+  MaxFilter(input, num_samples, window_size, output, &scratch);
+}
+
+// The same with the suffix maxima in *scratch (resized to num_samples), for
+// callers that run the filter often and keep their buffers.
+template <typename T>
+void MaxFilter(const T* input, int num_samples, int window_size, T* output,
+               std::vector<T>* scratch) {
   CHECK(num_samples >= 0);
   CHECK(window_size >= 1);
   if (num_samples == 0) return;
   CHECK(input);
   CHECK(output);
+  CHECK(scratch);
+  // std::max's form, which compilers turn into a single max instruction.
+  auto max = [](T a, T b) { return a < b ? b : a; };
+  const int n = num_samples;
+  const int w = window_size;
 
-  // The queue holds indices with strictly decreasing values from front to
-  // back, all within the last window_size positions, so it never holds more
-  // than min(window_size, num_samples) entries. It is kept in a ring.
-  const int capacity = std::min(window_size, num_samples);
-  std::vector<int> ring(capacity);
-  int front = 0;  // Ring position of the front entry.
-  int count = 0;
-  auto wrap = [capacity](int position) {
-    return position >= capacity ? position - capacity : position;
-  };
+  // prefix (in output): maximum from the block's start to i; suffix: from i
+  // to the block's end (or the input's end).
+  scratch->resize(n);
+  T* const suffix = scratch->data();
+  const int64_t full_blocks = n / w;
+  for (int64_t b = 0; b < full_blocks; ++b) {
+    output[b * w] = input[b * w];
+    suffix[b * w + w - 1] = input[b * w + w - 1];
+  }
+  // Each running maximum is a chain of dependent steps; stepping all blocks
+  // in lockstep, both directions at once, lets independent chains overlap.
+  for (int64_t i = 1; i < w; ++i) {
+    for (int64_t b = 0; b < full_blocks; ++b) {
+      const int64_t start = b * w;
+      const int64_t last = start + w - 1;
+      output[start + i] = max(input[start + i], output[start + i - 1]);
+      suffix[last - i] = max(input[last - i], suffix[last - i + 1]);
+    }
+  }
+  const int64_t start = full_blocks * w;  // The partial block at the end, if any.
+  if (start < n) {
+    output[start] = input[start];
+    suffix[n - 1] = input[n - 1];
+    for (int64_t i = 1; i < n - start; ++i) {
+      output[start + i] = max(input[start + i], output[start + i - 1]);
+      suffix[n - 1 - i] = max(input[n - 1 - i], suffix[n - i]);
+    }
+  }
 
-  const int h = (window_size - 1) / 2;
-  const int64_t end = static_cast<int64_t>(num_samples) + h;
-  for (int64_t i = 0; i < end; ++i) {
-    if (count > 0 && ring[front] <= i - window_size) {
-      front = wrap(front + 1);
-      --count;
-    }
-    if (i < num_samples) {
-      const T& value = input[i];
-      // An equal value replaces the queued one, so equal values never pile up.
-      while (count > 0 && value >= input[ring[wrap(front + count - 1)]]) --count;
-      ring[wrap(front + count)] = static_cast<int>(i);
-      ++count;
-    }
-    if (i >= h) output[i - h] = input[ring[front]];
+  // Output k covers a = k - (w - h) + 1 .. b = k + h. Each step reads
+  // prefix values at b >= k and overwrites output k, whose prefix value no
+  // later step needs.
+  const int h = (w - 1) / 2;
+  const int64_t first_full = static_cast<int64_t>(w) - h - 1;  // First k with a >= 0.
+  const int64_t last_full = static_cast<int64_t>(n) - 1 - h;   // Last k with b < n.
+  for (int64_t k = 0; k < std::min<int64_t>(first_full, n); ++k) {
+    // Clipped at the start: the window lies in the first block.
+    output[k] = output[std::min<int64_t>(k + h, n - 1)];
+  }
+  for (int64_t k = first_full; k <= last_full; ++k) {
+    output[k] = max(suffix[k - first_full], output[k + h]);
+  }
+  const T last_prefix = output[n - 1];
+  const int64_t last_block_start = (n - 1) / w * w;
+  for (int64_t k = std::max(first_full, last_full + 1); k < n; ++k) {
+    // Clipped at the end: from a to the last sample.
+    const int64_t a = k - first_full;
+    output[k] = a >= last_block_start ? suffix[a] : max(suffix[a], last_prefix);
   }
 }
 

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <limits>
 #include <utility>
 
 #include "audio/vesknet/crc16_coder.h"
@@ -20,11 +21,17 @@ AudioModemDecoder::AudioModemDecoder(std::unique_ptr<ZintarDecoder> zintar_decod
   token_size_ = zintar_decoder_->token_size();
 }
 
+AudioModemDecoder::AudioModemDecoder(std::unique_ptr<audio_vesknet::DtmfDecoder> dtmf_decoder)
+    : dtmf_decoder_(std::move(CHECK_NOTNULL(dtmf_decoder))), kind_(kDtmf) {
+  token_size_ = dtmf_decoder_->params().bytes_in_token;
+}
+
 AudioModemDecoder::~AudioModemDecoder() = default;
 
 void AudioModemDecoder::Initialize(float sample_rate, int num_channels) {
   if (kind_ == kDsss) dsss_decoder_->Initialize(sample_rate, num_channels);
   if (kind_ == kZintar) zintar_decoder_->Initialize(sample_rate, num_channels);
+  if (kind_ == kDtmf) dtmf_decoder_->Init(sample_rate, num_channels);
 }
 
 void AudioModemDecoder::ProcessSamples(const std::vector<float>& samples) {
@@ -35,6 +42,7 @@ void AudioModemDecoder::ProcessSamples(const std::vector<float>& samples) {
     for (size_t i = 0; i < samples.size(); ++i) raw_[i] = static_cast<int16_t>(samples[i]);
     zintar_decoder_->ProcessSamples(raw_.data(), static_cast<int>(raw_.size()));
   }
+  if (kind_ == kDtmf) dtmf_decoder_->ProcessSamples(samples);
 }
 
 void AudioModemDecoder::ProcessSamplesWithZintar(int16_t* samples, int count) {
@@ -51,6 +59,7 @@ bool AudioModemDecoder::DetectBroadcaster() {
 void AudioModemDecoder::WipeInternalData() {
   if (kind_ == kDsss) dsss_decoder_->WipeInternalData();
   if (kind_ == kZintar) zintar_decoder_->WipeInternalData();
+  if (kind_ == kDtmf) dtmf_decoder_->Reset();
 }
 
 int AudioModemDecoder::GetMaxSafeInputSize() const {
@@ -59,6 +68,12 @@ int AudioModemDecoder::GetMaxSafeInputSize() const {
     return std::max(0, frames) * dsss_decoder_->num_channels();
   }
   if (kind_ == kZintar) return zintar_decoder_->GetMaxSafeInputSize();
+  if (kind_ == kDtmf) {
+    const int64_t frames =
+        dtmf_decoder_->max_buffer_size() - dtmf_decoder_->buffered_received_samples();
+    const int64_t samples = std::max<int64_t>(0, frames) * dtmf_decoder_->num_channels();
+    return static_cast<int>(std::min<int64_t>(samples, std::numeric_limits<int>::max()));
+  }
   return 0;
 }
 
@@ -90,6 +105,12 @@ bool AudioModemDecoder::GetTokens(DecodeResults* decode_results, int num_message
     }
     raw.frame_times = std::move(dsss_results.frame_times);
     raw.frame_scores = std::move(dsss_results.frame_scores);
+  } else if (kind_ == kDtmf) {
+    std::vector<audio_vesknet::DtmfDecodedToken> tokens = dtmf_decoder_->GetToken();
+    if (tokens.empty()) return false;
+    for (audio_vesknet::DtmfDecodedToken& token : tokens) {
+      raw.tokens.push_back({std::move(token.bytes), 0, token.score});
+    }
   } else {
     return false;
   }
@@ -163,6 +184,48 @@ std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
   } else {
     decoder = std::make_unique<AudioModemDecoder>(std::move(dsss_decoder));
   }
+  decoder->Initialize(config.input_sample_rate, config.num_channels);
+  return decoder;
+}
+
+std::string DtmfDecoderConfigError(const DtmfDecoderConfig& config) {
+  const std::string waveform_error = DtmfWaveformConfigError(config);
+  if (!waveform_error.empty()) return waveform_error;
+  if (config.max_tokens_per_call < 1 || config.max_tokens_per_call > kMaxDtmfTokensPerCall) {
+    return "tokens per call must be 1 to " + std::to_string(kMaxDtmfTokensPerCall);
+  }
+  if (!(config.input_sample_rate >= 1000)) return "the microphone rate must be at least 1000 Hz";
+  // The resampler approximates the rate ratio by a fraction of denominator
+  // 2000 at most.
+  const float ratio = config.input_sample_rate / config.sample_rate;
+  if (!(ratio >= 0.001f && ratio <= 1000.0f)) {
+    return "the microphone rate must be within a factor 1000 of the sample rate";
+  }
+  if (config.num_channels < 1) return "the microphone needs at least one channel";
+  if (!(config.buffer_length_tokens >= 1 && config.buffer_length_tokens <= 100)) {
+    return "the buffer must hold 1 to 100 tokens";
+  }
+  return std::string();
+}
+
+std::unique_ptr<AudioModemDecoder> MakeDtmfAudioModemDecoder(const DtmfDecoderConfig& config) {
+  return MakeDtmfAudioModemDecoder(config, audio_vesknet::DtmfDecoderParams());
+}
+
+std::unique_ptr<AudioModemDecoder> MakeDtmfAudioModemDecoder(
+    const DtmfDecoderConfig& config, const audio_vesknet::DtmfDecoderParams& tuning) {
+  audio_vesknet::DtmfEncoderParams waveform;
+  if (!MakeDtmfEncoderParams(config, &waveform)) return nullptr;
+  audio_vesknet::DtmfDecoderParams params = tuning;
+  static_cast<audio_vesknet::DtmfEncoderParams&>(params) = waveform;
+  params.max_candidates_per_decode_token_call = config.max_tokens_per_call;
+  // Hosts may ask for more tokens per call than the rank checks sequences:
+  // the rank grows to match instead of failing the token selector's check.
+  params.max_candidates_rank = std::max(params.max_candidates_rank, config.max_tokens_per_call);
+  params.max_buffer_duration_in_seconds =
+      config.buffer_length_tokens * audio_vesknet::GetTokenDurationSeconds(params);
+  auto decoder =
+      std::make_unique<AudioModemDecoder>(std::make_unique<audio_vesknet::DtmfDecoder>(params));
   decoder->Initialize(config.input_sample_rate, config.num_channels);
   return decoder;
 }

@@ -14,9 +14,11 @@
 #include <string>
 #include <vector>
 
+#include "audio/vesknet/dtmf/dtmf_decoder.h"
 #include "audio/vesknet/vesknet_decoder.h"
 #include "social/tandry/audio/dsss_waveform_config.h"
 #include "social/tandry/audio/zintar_decoder.h"
+#include "social/tandry/audio/dtmf_waveform_config.h"
 
 namespace audio_modem {
 
@@ -29,8 +31,8 @@ struct TokenResult {
 
 struct DecodeResults {
   std::vector<TokenResult> tokens;  // In the order the lower decoder found them.
-  std::vector<float> frame_times;   // DSSS: seconds of the chosen group's frames.
-  std::vector<float> frame_scores;  // DSSS: their filtered acquisition scores.
+  std::vector<float> frame_times;   // DSSS: seconds of the chosen group's frames; DTMF: empty.
+  std::vector<float> frame_scores;  // DSSS: their filtered acquisition scores; DTMF: empty.
 };
 
 class AudioModemDecoder {
@@ -41,6 +43,8 @@ class AudioModemDecoder {
   explicit AudioModemDecoder(std::unique_ptr<audio_vesknet::VesknetDecoder> dsss_decoder);
   // Takes ownership of a DSSS decoder behind the zintar listening mode.
   explicit AudioModemDecoder(std::unique_ptr<ZintarDecoder> zintar_decoder);
+  // Takes ownership of a DTMF decoder; token size = its bytes_in_token.
+  explicit AudioModemDecoder(std::unique_ptr<audio_vesknet::DtmfDecoder> dtmf_decoder);
   ~AudioModemDecoder();
 
   // Input at `sample_rate` Hz with `num_channels` interleaved channels.
@@ -51,6 +55,7 @@ class AudioModemDecoder {
   // Raw 16-bit samples for the zintar listening mode; other kinds ignore them.
   // The buffer may be overwritten (mixed down in place).
   void ProcessSamplesWithZintar(int16_t* samples, int count);
+  // DSSS: whether a transmitter is audible; DTMF: always false.
   bool DetectBroadcaster();
   // Forgets the audio heard so far.
   void WipeInternalData();
@@ -70,8 +75,10 @@ class AudioModemDecoder {
   Kind kind() const { return kind_; }
 
  private:
+  // Exactly one is set.
   std::unique_ptr<audio_vesknet::VesknetDecoder> dsss_decoder_;
   std::unique_ptr<ZintarDecoder> zintar_decoder_;
+  std::unique_ptr<audio_vesknet::DtmfDecoder> dtmf_decoder_;
   Kind kind_;
   std::vector<int16_t> raw_;  // Scratch for the zintar kind.
   int token_size_;
@@ -115,6 +122,39 @@ std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(const DsssDecoderCo
 // does not set it (for measurements of the tuning itself).
 std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
     const DsssDecoderConfig& config, const audio_vesknet::VesknetDecoderParams& tuning);
+
+// Tokens per call a DTMF decoder configuration may ask for, as for DSSS.
+constexpr int kMaxDtmfTokensPerCall = 6;
+
+// Everything a host chooses about a DTMF decoder, in plain values: the
+// waveform, which must match the transmitter's (the defaults hear the
+// product transmitter, see DtmfWaveformConfig), and the microphone.
+struct DtmfDecoderConfig : DtmfWaveformConfig {
+  // 1 to kMaxDtmfTokensPerCall; above the tuning's max_candidates_rank (3 by
+  // default) the rank is raised to match.
+  int max_tokens_per_call = 2;
+  float input_sample_rate = 44100.0f;  // Microphone rate, Hz, > 0.
+  int num_channels = 1;                // Interleaved microphone channels, >= 1.
+  // History held, in token durations, 1 to 100. Four: three repetitions of a
+  // token and the one being received.
+  float buffer_length_tokens = 4.0f;
+};
+
+// Empty when `config` can be built; otherwise a sentence saying what is wrong.
+std::string DtmfDecoderConfigError(const DtmfDecoderConfig& config);
+
+// Builds the DTMF parameter record, the DTMF decoder and the front object,
+// initialised for the configured input. Returns null, having logged why, when
+// the envelope is refused (see audio_vesknet::SetAdsrWindow); any other
+// invalid field aborts in the decoder's checks (check DtmfDecoderConfigError
+// first when the configuration comes from a user).
+std::unique_ptr<AudioModemDecoder> MakeDtmfAudioModemDecoder(const DtmfDecoderConfig& config);
+
+// As above, with the receiver's tuning (the fields after the transmitter's
+// record) taken from `tuning` wherever `config` does not set it (for
+// measurements of the tuning itself).
+std::unique_ptr<AudioModemDecoder> MakeDtmfAudioModemDecoder(
+    const DtmfDecoderConfig& config, const audio_vesknet::DtmfDecoderParams& tuning);
 
 }  // namespace audio_modem
 

@@ -1,5 +1,6 @@
 #include "social/tandry/audio/audio_modem_decoder.h"
 
+#include <cstdint>
 #include <vector>
 
 #include "base/scoped_log_capture.h"
@@ -109,6 +110,134 @@ TEST(AudioModemDecoderDeathTest, ChecksItsArguments) {
                "Check failed: 'dsss_decoder' Must be non-null");
   const auto decoder = Decoder();
   EXPECT_DEATH(decoder->GetTokens(nullptr, 6, 2), "Check failed: decode_results");
+}
+
+// The product DTMF transmitter's audio for `token` plus `crc` check bytes,
+// played 3 times at a third of full scale, in the 16-bit range.
+std::vector<float> DtmfAudio(const std::vector<uint8_t>& token, int crc) {
+  std::vector<float> token_audio;
+  MakeDtmfAudioModemEncoder(DtmfEncoderConfig())->Encode(token, &token_audio, crc);
+  std::vector<float> played(5000, 0.0f);
+  for (int r = 0; r < 3; ++r) {
+    for (const float s : token_audio) played.push_back(10000.0f * s);
+  }
+  played.resize(played.size() + 10000, 0.0f);
+  return played;
+}
+
+TEST(AudioModemDecoderTest, DtmfKindDecodesAndVerifiesCrc) {
+  const auto decoder = MakeDtmfAudioModemDecoder(DtmfDecoderConfig());
+  ASSERT_NE(decoder, nullptr);
+  EXPECT_EQ(decoder->kind(), AudioModemDecoder::kDtmf);
+  EXPECT_EQ(decoder->token_size(), 5);
+  const std::vector<uint8_t> message = {0x12, 0x34, 0x56};
+  decoder->ProcessSamples(DtmfAudio(message, 2));
+  EXPECT_FALSE(decoder->DetectBroadcaster());
+
+  DecodeResults results;
+  ASSERT_TRUE(decoder->GetTokens(&results, 3, 2));
+  EXPECT_EQ(results.tokens.at(0).bytes, message);
+  EXPECT_TRUE(results.frame_times.empty());
+  EXPECT_TRUE(results.frame_scores.empty());
+  // Without verification the check bytes stay on.
+  ASSERT_TRUE(decoder->GetTokens(&results, 5, 0));
+  EXPECT_EQ(results.tokens.at(0).bytes.size(), 5u);
+  EXPECT_EQ(
+      std::vector<uint8_t>(results.tokens[0].bytes.begin(), results.tokens[0].bytes.begin() + 3),
+      message);
+
+  decoder->WipeInternalData();
+  EXPECT_FALSE(decoder->GetTokens(&results, 3, 2));
+}
+
+TEST(AudioModemDecoderTest, DtmfTokenFailingItsCrcIsDroppedSilently) {
+  const auto decoder = MakeDtmfAudioModemDecoder(DtmfDecoderConfig());
+  decoder->ProcessSamples(DtmfAudio({1, 2, 3, 4, 5}, 0));  // No valid CRC in it.
+  DecodeResults results;
+  base::ScopedLogCapture capture;
+  EXPECT_FALSE(decoder->GetTokens(&results, 3, 2));
+  EXPECT_TRUE(results.tokens.empty());
+  EXPECT_TRUE(capture.lines().empty());
+  EXPECT_TRUE(decoder->GetTokens(&results, 5, 0));
+}
+
+TEST(AudioModemDecoderTest, DtmfGeometryRefusalsAreLoggedInOrder) {
+  const auto decoder = MakeDtmfAudioModemDecoder(DtmfDecoderConfig());
+  DecodeResults results;
+  results.tokens.resize(1);
+  base::ScopedLogCapture capture;
+  EXPECT_FALSE(decoder->GetTokens(&results, 5, 2));   // 7 != 5.
+  EXPECT_FALSE(decoder->GetTokens(&results, 0, 5));   // Adds up; no message.
+  EXPECT_FALSE(decoder->GetTokens(&results, 7, -2));  // Adds up; negative.
+  EXPECT_EQ(results.tokens.size(), 1u);               // Untouched so far.
+  EXPECT_FALSE(decoder->GetTokens(&results, 4, 1));   // Nothing heard yet.
+  EXPECT_EQ(capture.Messages(base::LogSeverity::kError),
+            (std::vector<std::string>{
+                "num_message_bytes and num_crc_check_bytes do not add to correct value",
+                "num_message_bytes must be positive", "num_crc_check_bytes must be non-negative"}));
+  decoder->ProcessSamples(DtmfAudio({1, 2, 3, 4, 5}, 0));
+  EXPECT_FALSE(decoder->GetTokens(&results, 4, 1));
+  EXPECT_TRUE(
+      capture.Contains(base::LogSeverity::kError, "Unsupported value for num_crc_check_bytes"));
+}
+
+// Four tokens of 10 symbols of 2208 samples: 88320 frames, less the one
+// strength's worth (16 samples) that an empty history stands for.
+TEST(AudioModemDecoderTest, DtmfMaxSafeInputSizeCountsAllChannels) {
+  DtmfDecoderConfig config;
+  config.num_channels = 2;
+  const auto decoder = MakeDtmfAudioModemDecoder(config);
+  EXPECT_EQ(decoder->GetMaxSafeInputSize(), 2 * (88320 - 16));
+  decoder->ProcessSamples(std::vector<float>(2 * 1600, 0.0f));
+  EXPECT_EQ(decoder->GetMaxSafeInputSize(), 2 * (88320 - 1616));
+  int16_t raw[4] = {1, 2, 3, 4};
+  decoder->ProcessSamplesWithZintar(raw, 4);  // Not a zintar decoder: ignored.
+  EXPECT_EQ(decoder->GetMaxSafeInputSize(), 2 * (88320 - 1616));
+  decoder->WipeInternalData();
+  EXPECT_EQ(decoder->GetMaxSafeInputSize(), 2 * (88320 - 16));
+}
+
+TEST(AudioModemDecoderTest, DtmfFactoryRefusalsAndTuning) {
+  EXPECT_EQ(DtmfDecoderConfigError(DtmfDecoderConfig()), "");
+  std::vector<DtmfDecoderConfig> bad(5);
+  bad[0].max_tokens_per_call = 7;
+  bad[1].input_sample_rate = 500;
+  bad[2].num_channels = 0;
+  bad[3].buffer_length_tokens = 0.5f;
+  bad[4].tones_per_symbol = 3;
+  const std::vector<std::string> expected = {
+      "tokens per call must be 1 to 6", "the microphone rate must be at least 1000 Hz",
+      "the microphone needs at least one channel", "the buffer must hold 1 to 100 tokens",
+      "the default tone set makes symbols of 2 tones"};
+  for (size_t i = 0; i < bad.size(); ++i) EXPECT_EQ(DtmfDecoderConfigError(bad[i]), expected[i]);
+
+  DtmfDecoderConfig config;
+  config.sustain_time = 0.01f;  // 0.06 s of envelope in a 0.05 s symbol.
+  EXPECT_NE(DtmfDecoderConfigError(config), "");
+  base::ScopedLogCapture capture;
+  EXPECT_EQ(MakeDtmfAudioModemDecoder(config), nullptr);
+  EXPECT_TRUE(capture.Contains(base::LogSeverity::kError, "SetAdsrWindow(): Nonzero duration"));
+
+  // More tokens per call than the default rank: the rank follows.
+  config = DtmfDecoderConfig();
+  config.max_tokens_per_call = 6;
+  const auto six = MakeDtmfAudioModemDecoder(config);
+  six->ProcessSamples(DtmfAudio({1, 2, 3, 4, 5}, 0));
+  DecodeResults six_results;
+  EXPECT_TRUE(six->GetTokens(&six_results, 5, 0));
+
+  // The tuning reaches the decoder: an unreachable threshold hears nothing.
+  audio_vesknet::DtmfDecoderParams tuning;
+  tuning.acquisition_threshold = 1e9f;
+  const auto deaf = MakeDtmfAudioModemDecoder(DtmfDecoderConfig(), tuning);
+  deaf->ProcessSamples(DtmfAudio({1, 2, 3, 4, 5}, 0));
+  DecodeResults results;
+  EXPECT_FALSE(deaf->GetTokens(&results, 5, 0));
+}
+
+TEST(AudioModemDecoderDeathTest, NeedsADtmfDecoder) {
+  EXPECT_DEATH(AudioModemDecoder(std::unique_ptr<audio_vesknet::DtmfDecoder>()),
+               "Check failed: 'dtmf_decoder' Must be non-null");
 }
 
 }  // namespace

@@ -14,6 +14,7 @@
 #include "audio/vesknet/dtmf/dtmf_encoder.h"
 #include "audio/vesknet/vesknet_encoder.h"
 #include "social/tandry/audio/dsss_waveform_config.h"
+#include "social/tandry/audio/dtmf_waveform_config.h"
 
 namespace audio_modem {
 
@@ -79,30 +80,9 @@ std::string DsssEncoderConfigError(const DsssEncoderConfig& config);
 // division first. A configuration that the coder rejects aborts.
 std::unique_ptr<AudioModemEncoder> MakeDsssAudioModemEncoder(const DsssEncoderConfig& config);
 
-// Everything a host chooses about a DTMF encoder, in plain values; defaults
-// are the product configuration: 5-byte tokens (check bytes included) with a
-// checksum symbol (without it the receiver cannot tell wrong tokens from
-// right ones), 44100 Hz, decimation 16, 0.05 s symbols (2208 samples) of 2
-// tones from the default ten-tone set, under a 25 ms attack and 25 ms release
-// envelope.
-struct DtmfEncoderConfig {
-  int bytes_in_token = 5;  // Check bytes included, > 0.
-  bool append_checksum_symbol = true;
-  float sample_rate = 44100.0f;  // Hz.
-  int baseband_decimation_factor = 16;
-  float window_duration = 0.05f;  // Nominal symbol length, seconds.
-  int tones_per_symbol = 2;       // Must be 2 with the default tone set.
-  // Envelope: seconds, adding up to at most window_duration, and the
-  // sustain level in [0, 1].
-  float attack_time = 0.025f;
-  float decay_time = 0.0f;
-  float sustain_time = 0.0f;
-  float release_time = 0.025f;
-  float sustain_amplitude = 1.0f;
-  // Hz, each in [0, sample_rate / 2); every tones_per_symbol-combination is
-  // a symbol, the last one the spacer. Empty = the default ten-tone set.
-  std::vector<float> tone_frequencies;
-};
+// Everything a host chooses about a DTMF encoder: the waveform alone (see
+// DtmfWaveformConfig for the product defaults).
+struct DtmfEncoderConfig : DtmfWaveformConfig {};
 
 // Empty when `config` is sound, and MakeDtmfAudioModemEncoder(config) then
 // builds an encoder; otherwise a sentence saying what is wrong: a field that

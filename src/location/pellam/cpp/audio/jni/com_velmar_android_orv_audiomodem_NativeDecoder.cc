@@ -11,6 +11,7 @@
 #include <cstdint>
 #include <cstring>
 #include <memory>
+#include <utility>
 #include <vector>
 
 #include "base/logging.h"
@@ -86,17 +87,50 @@ Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDsss(
   return JNI_TRUE;
 }
 
+// Returns false, keeping the id's previous decoder, when the envelope is
+// refused (logged) or a Java exception is pending after reading the tone
+// array. An empty or null tone array selects the default tone set. The
+// eighth Java argument is ignored: nothing has ever read it.
 JNIEXPORT jboolean JNICALL
 Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDtmf(
-    JNIEnv* /*env*/, jobject /*thiz*/, jint /*id*/, jint /*bytes_in_token*/,
-    jboolean /*append_checksum_symbol*/, jfloat /*sample_rate*/,
-    jint /*baseband_decimation_factor*/, jfloat /*window_duration*/, jint /*tones_per_symbol*/,
-    jint /*ignored*/, jint /*max_tokens_per_call*/, jfloat /*input_sample_rate*/,
-    jint /*num_channels*/, jfloat /*attack_time*/, jfloat /*decay_time*/, jfloat /*sustain_time*/,
-    jfloat /*release_time*/, jfloat /*sustain_amplitude*/, jfloat /*buffer_length_tokens*/,
-    jfloatArray /*tone_frequencies*/) {
-  LOG(ERROR) << "DTMF decoding is not available in this build.";
-  return JNI_FALSE;
+    JNIEnv* env, jobject /*thiz*/, jint id, jint bytes_in_token, jboolean append_checksum_symbol,
+    jfloat sample_rate, jint baseband_decimation_factor, jfloat window_duration,
+    jint tones_per_symbol, jint /*ignored*/, jint max_tokens_per_call, jfloat input_sample_rate,
+    jint num_channels, jfloat attack_time, jfloat decay_time, jfloat sustain_time,
+    jfloat release_time, jfloat sustain_amplitude, jfloat buffer_length_tokens,
+    jfloatArray tone_frequencies) {
+  audio_modem::DtmfDecoderConfig config;
+  config.bytes_in_token = bytes_in_token;
+  config.append_checksum_symbol = append_checksum_symbol;
+  config.sample_rate = sample_rate;
+  config.baseband_decimation_factor = baseband_decimation_factor;
+  config.window_duration = window_duration;
+  config.tones_per_symbol = tones_per_symbol;
+  config.max_tokens_per_call = max_tokens_per_call;
+  config.input_sample_rate = input_sample_rate;
+  config.num_channels = num_channels;
+  config.attack_time = attack_time;
+  config.decay_time = decay_time;
+  config.sustain_time = sustain_time;
+  config.release_time = release_time;
+  config.sustain_amplitude = sustain_amplitude;
+  config.buffer_length_tokens = buffer_length_tokens;
+
+  const jsize num_tones = tone_frequencies == nullptr ? 0 : env->GetArrayLength(tone_frequencies);
+  if (env->ExceptionCheck()) return JNI_FALSE;
+  if (num_tones > 0) {
+    jfloat* elements = env->GetFloatArrayElements(tone_frequencies, nullptr);
+    if (elements != nullptr) {
+      config.tone_frequencies.assign(elements, elements + num_tones);
+      env->ReleaseFloatArrayElements(tone_frequencies, elements, 0);
+    }
+    if (elements == nullptr || env->ExceptionCheck()) return JNI_FALSE;
+  }
+
+  std::unique_ptr<AudioModemDecoder> decoder = audio_modem::MakeDtmfAudioModemDecoder(config);
+  if (!decoder) return JNI_FALSE;
+  vesk_jni::GlobalDecoderRegistry().Store(id, std::move(decoder));
+  return JNI_TRUE;
 }
 
 JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeProcessSamples(

@@ -1,0 +1,447 @@
+#include "audio/vesknet/dtmf/dtmf_decoder.h"
+
+#include <algorithm>
+#include <cmath>
+#include <complex>
+#include <limits>
+#include <utility>
+
+#include "audio/dsp/max_filter.h"
+#include "audio/dsp/resampling_kernel.h"
+#include "audio/vesknet/compute_buffer_truncation.h"
+#include "base/logging.h"
+
+// Some checks compare a vector's size with an int, as their texts read.
+#pragma GCC diagnostic ignored "-Wsign-compare"
+
+namespace audio_vesknet {
+namespace {
+
+constexpr double kSpeedOfSound = 340.0;  // m/s.
+// Bandwidth of one symbol's envelope, in cycles per symbol duration.
+constexpr float kSymbolBandwidth = 0.594f;
+// Largest denominator of the resampler's rate fraction (filter phases).
+constexpr int kResamplerMaxDenominator = 2000;
+// Keeps the acquisition ratio finite when the noise estimate is zero.
+constexpr float kNoiseFloor = 1e-12f;
+
+// The checks run before any member is built from the record.
+const DtmfDecoderParams& Validated(const DtmfDecoderParams& params) {
+  ValidateDtmfEncoderParams(params);
+  CHECK(params.max_meters_per_second >= 0.0);
+  CHECK(params.max_buffer_duration_in_seconds > 0.0);
+  CHECK(params.tone_normalization_params.window_size >= 0.0);
+  CHECK(params.tone_normalization_params.cross_frequency_weight >= 0.0);
+  CHECK(params.tone_normalization_params.division_floor >= 0.0);
+  CHECK(params.noise_estimate_filter_order > 0);
+  CHECK(params.noise_estimate_filter_stddev > 0.0);
+  CHECK(params.acquisition_threshold >= 0.0);
+  CHECK(params.max_candidates_rank > 0);
+  CHECK(params.max_candidates_per_decode_token_call > 0);
+  CHECK(params.token_threshold_factor >= 0);
+  return params;
+}
+
+TokenSelectorParams MakeTokenSelectorParams(const DtmfDecoderParams& params,
+                                            const ByteSymbolConverter& converter) {
+  TokenSelectorParams selector;
+  selector.alphabet_size = static_cast<int>(params.symbol_table.size());
+  selector.spacer = params.spacer_symbol;
+  selector.symbols_in_token = converter.symbols_in_token();
+  selector.use_checksum_symbol = params.append_checksum_symbol;
+  selector.max_candidates_rank = params.max_candidates_rank;
+  selector.max_candidates_to_return = params.max_candidates_per_decode_token_call;
+  selector.token_threshold_factor = params.token_threshold_factor;
+  return selector;
+}
+
+float ToneFilterBandwidth(const DtmfDecoderParams& params, float symbol_duration) {
+  float max_frequency = 0.0f;
+  for (const float frequency : params.tone_frequencies) {
+    max_frequency = std::max(max_frequency, frequency);
+  }
+  return kSymbolBandwidth / symbol_duration +
+         static_cast<float>(max_frequency * params.max_meters_per_second / kSpeedOfSound);
+}
+
+// round(value) half away from zero, limited to [0, 2^31 - 1]: the buffer
+// arithmetic is done in 32-bit frame counts.
+int64_t RoundToFrameCount(double value) {
+  const double rounded = std::round(value);
+  if (!(rounded > 0.0)) return 0;
+  return static_cast<int64_t>(std::min<double>(rounded, std::numeric_limits<int32_t>::max()));
+}
+
+int32_t ClampToInt32(int64_t value) {
+  return static_cast<int32_t>(std::min<int64_t>(value, std::numeric_limits<int32_t>::max()));
+}
+
+}  // namespace
+
+DtmfDecoder::DtmfDecoder(const DtmfDecoderParams& params)
+    : params_(Validated(params)),
+      converter_(static_cast<int>(params_.symbol_table.size()), params_.spacer_symbol,
+                 params_.bytes_in_token),
+      token_selector_(MakeTokenSelectorParams(params_, converter_)),
+      num_frequencies_(static_cast<int>(params_.tone_frequencies.size())),
+      frame_size_(GetFrameSize(params_)),
+      samples_per_symbol_(frame_size_ / params_.baseband_decimation_factor),
+      symbol_duration_(static_cast<float>(frame_size_) / params_.sample_rate),
+      baseband_rate_(params_.sample_rate / static_cast<float>(params_.baseband_decimation_factor)),
+      tone_bandwidth_(ToneFilterBandwidth(params_, symbol_duration_)),
+      tone_strength_buffers_(num_frequencies_),
+      noise_filter_(audio_dsp::GammaFilterFromStddev(
+          baseband_rate_, params_.noise_estimate_filter_order,
+          static_cast<float>(samples_per_symbol_) * params_.noise_estimate_filter_stddev)) {
+  tone_filters_.reserve(num_frequencies_);
+  for (const float frequency : params_.tone_frequencies) {
+    tone_filters_.emplace_back(params_.sample_rate, frequency, tone_bandwidth_,
+                               params_.baseband_decimation_factor);
+  }
+  folded_.resize(samples_per_symbol_);
+}
+
+DtmfDecoder::~DtmfDecoder() = default;
+
+void DtmfDecoder::Init(float received_sample_rate, int num_channels) {
+  CHECK(received_sample_rate > 0.0);
+  CHECK(num_channels >= 1);
+  received_sample_rate_ = received_sample_rate;
+  num_channels_ = num_channels;
+  ratio_ = received_sample_rate / baseband_rate_;
+  // The token with its leading spacer and checksum symbol, if any.
+  const int symbols = converter_.symbols_in_token() + (params_.append_checksum_symbol ? 1 : 0) + 1;
+  token_length_ = RoundToFrameCount(static_cast<double>(symbols) * received_sample_rate *
+                                    static_cast<double>(symbol_duration_));
+  max_buffer_size_ = RoundToFrameCount(static_cast<double>(params_.max_buffer_duration_in_seconds) *
+                                       received_sample_rate);
+
+  if (!(received_sample_rate == params_.sample_rate)) {
+    const audio_dsp::DefaultResamplingKernel kernel(received_sample_rate, params_.sample_rate);
+    received_resampler_ = std::make_unique<audio_dsp::RationalFactorResampler<float>>(
+        kernel, kResamplerMaxDenominator);
+    CHECK(received_resampler_->Valid()) << "Failed to initialize RationalFactorResampler.";
+  } else {
+    received_resampler_.reset();
+  }
+
+  tone_strength_buffer_size_ = 0;
+  for (ToneStrengthFilter& filter : tone_filters_) filter.Reset();
+  for (ToneStrengthQueue& buffer : tone_strength_buffers_) buffer.Clear();
+  initialized_ = true;
+}
+
+void DtmfDecoder::Reset() {
+  for (ToneStrengthQueue& buffer : tone_strength_buffers_) buffer.Clear();
+  tone_strength_buffer_size_ = 0;
+  if (initialized_) Init(received_sample_rate_, num_channels_);
+}
+
+int64_t DtmfDecoder::buffered_received_samples() const {
+  return static_cast<int64_t>(
+      std::ceil((static_cast<double>(tone_strength_buffer_size_) + 1.0) * ratio_));
+}
+
+std::vector<float> DtmfDecoder::ToneStrengths(int tone) const {
+  const ToneStrengthQueue& buffer = tone_strength_buffers_.at(tone);
+  return std::vector<float>(buffer.data(), buffer.data() + buffer.Size());
+}
+
+void DtmfDecoder::ProcessSamples(const std::vector<float>& received_samples) {
+  if (!initialized_) {
+    LOG(ERROR) << "ProcessSamples() called before call to Init().";
+    return;
+  }
+  if (received_samples.empty()) return;
+
+  const int64_t input_frames = static_cast<int64_t>(received_samples.size()) / num_channels_;
+  int32_t samples_to_skip = 0;
+  int32_t samples_to_drop = 0;
+  ComputeBufferTruncation(ClampToInt32(input_frames), ClampToInt32(buffered_received_samples()),
+                          ClampToInt32(token_length_), ClampToInt32(max_buffer_size_),
+                          &samples_to_skip, &samples_to_drop);
+  const int64_t skipped_values = static_cast<int64_t>(samples_to_skip) * num_channels_;
+  if (skipped_values >= 1) {
+    // The block alone overruns the buffer: start afresh on its tail.
+    Init(received_sample_rate_, num_channels_);
+    ProcessSamples(
+        std::vector<float>(received_samples.begin() + skipped_values, received_samples.end()));
+    return;
+  }
+  if (samples_to_drop > 0) DropHistory(samples_to_drop);
+
+  if (num_channels_ == 1) {
+    FeedMono(received_samples);
+    return;
+  }
+  CHECK(received_samples.size() % num_channels_ == 0);
+  const int frames = static_cast<int>(input_frames);
+  const float scale = 1.0f / static_cast<float>(num_channels_);
+  mono_.resize(frames);
+  const float* interleaved = received_samples.data();
+  for (int i = 0; i < frames; ++i) {
+    float sum = 0.0f;
+    for (int c = 0; c < num_channels_; ++c) sum += interleaved[c];
+    mono_[i] = sum * scale;
+    interleaved += num_channels_;
+  }
+  FeedMono(mono_);
+}
+
+void DtmfDecoder::DropHistory(int64_t received_samples) {
+  int64_t drop = static_cast<int64_t>(std::ceil(static_cast<double>(received_samples) / ratio_));
+  if (drop <= 0) return;
+  // Whole symbols, so that symbol boundaries keep their place in the buffer.
+  drop = (drop + samples_per_symbol_ - 1) / samples_per_symbol_ * samples_per_symbol_;
+  const int count = static_cast<int>(std::min<int64_t>(drop, tone_strength_buffer_size_));
+  for (ToneStrengthQueue& buffer : tone_strength_buffers_) buffer.DropFront(count);
+  tone_strength_buffer_size_ -= count;
+}
+
+void DtmfDecoder::FeedMono(const std::vector<float>& mono) {
+  const std::vector<float>* input = &mono;
+  if (received_resampler_) {
+    received_resampler_->ProcessSamples(mono, &resampled_);
+    input = &resampled_;
+  }
+  for (int i = 0; i < num_frequencies_; ++i) {
+    tone_filters_[i].Process(*input, &filter_output_);
+    tone_strength_buffers_[i].Append(filter_output_);
+    if (i == 0) tone_strength_buffer_size_ += static_cast<int>(filter_output_.size());
+    CHECK(tone_strength_buffers_[i].Size() == tone_strength_buffer_size_);
+  }
+}
+
+void DtmfDecoder::NormalizeToneStrengths(audio_dsp::MatrixXf* tone_scores) {
+  CHECK(tone_scores);
+  NormalizeToRows();
+  const int n = tone_strength_buffer_size_;
+  // Every element is written below; resize only zero-fills on a new shape.
+  if (tone_scores->rows() != num_frequencies_ || tone_scores->cols() != n) {
+    tone_scores->resize(num_frequencies_, n);
+  }
+  for (int t = 0; t < n; ++t) {
+    float* column = tone_scores->col(t);
+    for (int i = 0; i < num_frequencies_; ++i)
+      column[i] = normalized_[static_cast<size_t>(i) * n + t];
+  }
+}
+
+void DtmfDecoder::NormalizeToRows() {
+  const int n = tone_strength_buffer_size_;
+  const DtmfDecoderParams::ToneNormalizationParams& normalization =
+      params_.tone_normalization_params;
+  // Truncated; at least one sample (a width of 0 would be no maximum at all)
+  // and bounded so that the product cannot overflow.
+  const double width = std::floor(static_cast<double>(samples_per_symbol_) *
+                                  static_cast<double>(normalization.window_size));
+  const int window = static_cast<int>(std::max(1.0, std::min(width, double{1 << 30})));
+
+  normalized_.resize(static_cast<size_t>(num_frequencies_) * n);
+  for (int i = 0; i < num_frequencies_; ++i) {
+    audio_dsp::MaxFilter(tone_strength_buffers_[i].data(), n, window,
+                         normalized_.data() + static_cast<size_t>(i) * n, &max_filter_scratch_);
+  }
+
+  // m: the strongest tone's running maximum at each time.
+  column_max_.assign(normalized_.begin(), normalized_.begin() + n);
+  for (int i = 1; i < num_frequencies_; ++i) {
+    const float* x = normalized_.data() + static_cast<size_t>(i) * n;
+#pragma omp simd
+    for (int t = 0; t < n; ++t) column_max_[t] = std::max(column_max_[t], x[t]);
+  }
+  // In place of the running maxima, tone by tone (vectorisable).
+  const float weight = normalization.cross_frequency_weight;
+  const float floor = normalization.division_floor;
+  const float* m = column_max_.data();
+  for (int i = 0; i < num_frequencies_; ++i) {
+    float* x = normalized_.data() + static_cast<size_t>(i) * n;
+    const float* s = tone_strength_buffers_[i].data();
+#pragma omp simd
+    for (int t = 0; t < n; ++t) x[t] = s[t] / ((m[t] - x[t]) * weight + x[t] + floor);
+  }
+}
+
+void DtmfDecoder::ComputeAcquisitionScores(const audio_dsp::MatrixXf& tone_scores,
+                                           std::vector<float>* acquisition_scores) {
+  CHECK(tone_scores.rows() == num_frequencies_);
+  CHECK(tone_scores.cols() == tone_strength_buffer_size_);
+  CHECK(acquisition_scores);
+  const int n = tone_strength_buffer_size_;
+  // Tone-major copy, in one sequential pass over the columns.
+  rows_.resize(static_cast<size_t>(num_frequencies_) * n);
+  for (int t = 0; t < n; ++t) {
+    const float* column = tone_scores.col(t);
+    for (int i = 0; i < num_frequencies_; ++i) rows_[static_cast<size_t>(i) * n + t] = column[i];
+  }
+  ScoreToneRows(rows_.data(), acquisition_scores);
+}
+
+void DtmfDecoder::ScoreToneRows(const float* rows, std::vector<float>* acquisition_scores) {
+  const int n = tone_strength_buffer_size_;
+  // Position of the tones_per_symbol-th largest value; the k below it are the
+  // noise.
+  const int k = std::max(0, num_frequencies_ - params_.tones_per_symbol);
+  const int top_count = num_frequencies_ - k;
+  // A selection, not a sort, run for all times at once, tone by tone (the
+  // times are independent, so the loops vectorise): each tone's value
+  // bubbles through the top_count largest so far (largest first); what falls
+  // out of the last place is one of the k values below position k of the
+  // ascending order, and goes to the noise sum.
+  top_.assign(static_cast<size_t>(top_count) * n, -std::numeric_limits<float>::infinity());
+  noise_.assign(n, 0.0f);
+  float* __restrict noise_sum = noise_.data();
+  moving_.resize(n);
+  float* __restrict moving = moving_.data();
+  for (int i = 0; i < num_frequencies_; ++i) {
+    std::copy(rows + static_cast<size_t>(i) * n, rows + static_cast<size_t>(i + 1) * n, moving);
+    for (int j = 0; j < top_count; ++j) {
+      float* __restrict kept = top_.data() + static_cast<size_t>(j) * n;
+#pragma omp simd
+      for (int t = 0; t < n; ++t) {
+        const float larger = std::max(moving[t], kept[t]);
+        moving[t] = std::min(moving[t], kept[t]);
+        kept[t] = larger;
+      }
+    }
+    if (i >= top_count) {
+#pragma omp simd
+      for (int t = 0; t < n; ++t) noise_sum[t] += moving[t];
+    }
+  }
+  const float* peak = top_.data() + static_cast<size_t>(top_count - 1) * n;
+  acquisition_scores->assign(peak, peak + n);
+  if (k > 0) {
+    for (float& noise : noise_) noise /= static_cast<float>(k);
+  }
+  SmoothNoiseEstimate(&noise_);
+  for (int t = 0; t < n; ++t) (*acquisition_scores)[t] /= noise_[t] + kNoiseFloor;
+}
+
+void DtmfDecoder::SmoothNoiseEstimate(std::vector<float>* noise) {
+  CHECK(noise);
+  std::vector<float>& values = *noise;
+  const int n = static_cast<int>(values.size());
+  const int delay = noise_filter_.Delay();
+  if (n == 0) return;
+  if (n <= delay) {
+    double sum = 0.0;
+    for (const float value : values) sum += value;
+    std::fill(values.begin(), values.end(), static_cast<float>(sum / n));
+    return;
+  }
+  // With no delay there is nothing to pad; the first value starts the filter.
+  float head_mean = values[0];
+  float tail_mean = values[n - 1];
+  if (delay > 0) {
+    double head = 0.0, tail = 0.0;
+    for (int k = 0; k < delay; ++k) {
+      head += values[k];
+      tail += values[n - delay + k];
+    }
+    head_mean = static_cast<float>(head / delay);
+    tail_mean = static_cast<float>(tail / delay);
+  }
+  noise_filter_.Reset(head_mean);
+  for (int k = 0; k < delay; ++k) noise_filter_.Step(values[k]);
+  // In place: value k - delay is written after value k was read.
+  for (int k = delay; k < n; ++k) values[k - delay] = noise_filter_.Step(values[k]);
+  for (int k = n - delay; k < n; ++k) values[k] = noise_filter_.Step(tail_mean);
+}
+
+int DtmfDecoder::ComputeStartOffset(const std::vector<float>& acquisition_scores) const {
+  const int period = samples_per_symbol_;
+  const int n = static_cast<int>(acquisition_scores.size());
+  const int num_symbols = n / period;
+  std::vector<double>& folded = folded_;
+  std::fill(folded.begin(), folded.end(), 0.0);
+  for (int j = 0; j < num_symbols; ++j) {
+    const float* symbol = acquisition_scores.data() + static_cast<size_t>(j) * period;
+    for (int p = 0; p < period; ++p) folded[p] += symbol[p];
+  }
+  const std::complex<double> step = std::polar(1.0, 2.0 * M_PI / period);
+  std::complex<double> power = 1.0;
+  std::complex<double> sum = 0.0;
+  for (int p = 0; p < period; ++p) {
+    sum += folded[p] * power;
+    power *= step;
+  }
+  const double angle = std::atan2(sum.imag(), sum.real());
+  const int start = static_cast<int>(std::round(period * angle / (2.0 * M_PI)));
+  return ((start % period) + period) % period;
+}
+
+void DtmfDecoder::FindCandidates(const audio_dsp::MatrixXf& tone_scores,
+                                 const std::vector<float>& acquisition_scores, int start,
+                                 std::map<int, std::vector<float>>* candidates) const {
+  CHECK(tone_scores.rows() == num_frequencies_);
+  CHECK(tone_scores.cols() == tone_strength_buffer_size_);
+  CHECK(acquisition_scores.size() == tone_strength_buffer_size_);
+  CHECK(candidates);
+  FindCandidatesIn(
+      [&tone_scores](int tone, int64_t t) { return tone_scores(tone, static_cast<int>(t)); },
+      acquisition_scores, start, candidates);
+}
+
+template <typename ToneScore>
+void DtmfDecoder::FindCandidatesIn(ToneScore tone_score,
+                                   const std::vector<float>& acquisition_scores, int start,
+                                   std::map<int, std::vector<float>>* candidates) const {
+  candidates->clear();
+  const int64_t n = tone_strength_buffer_size_;
+  const int64_t period = samples_per_symbol_;
+  const std::vector<std::vector<int32_t>>& symbol_table = params_.symbol_table;
+  for (int64_t t = std::max(start, 0); t < n; t += period) {
+    float value = acquisition_scores[t];
+    // Inside the buffer a candidate must be supported by both neighbouring
+    // symbols; within one symbol of either end it stands alone.
+    if (t > period && t + period < n) {
+      value = std::min({acquisition_scores[t - period], value, acquisition_scores[t + period]});
+    }
+    if (!(value >= params_.acquisition_threshold)) continue;
+    // Keyed by symbol index, so that the token selector's folding (index mod
+    // token period) lines up with whole symbols.
+    std::vector<float>& scores = (*candidates)[static_cast<int>(t / period)];
+    scores.resize(symbol_table.size());
+    for (size_t s = 0; s < symbol_table.size(); ++s) {
+      // A symbol is as strong as its weakest tone.
+      float weakest = std::numeric_limits<float>::infinity();
+      for (const int32_t tone : symbol_table[s]) weakest = std::min(weakest, tone_score(tone, t));
+      scores[s] = weakest;
+    }
+  }
+}
+
+std::vector<DtmfDecodedToken> DtmfDecoder::GetToken() {
+  std::vector<DtmfDecodedToken> tokens;
+  if (!initialized_) {
+    LOG(ERROR) << "GetToken() called before call to Init().";
+    return tokens;
+  }
+  // The steps of NormalizeToneStrengths, ComputeAcquisitionScores and
+  // FindCandidates, on the normalised strengths as they come, tone after tone
+  // (the public steps lay them out time after time, which costs two copies).
+  NormalizeToRows();
+  ScoreToneRows(normalized_.data(), &acquisition_scores_);
+  const int start = ComputeStartOffset(acquisition_scores_);
+  const size_t n = static_cast<size_t>(tone_strength_buffer_size_);
+  const float* normalized = normalized_.data();
+  std::map<int, std::vector<float>> candidates;
+  FindCandidatesIn([normalized, n](int tone, int64_t t) { return normalized[tone * n + t]; },
+                   acquisition_scores_, start, &candidates);
+  // Fewer candidates than one token period cannot cover every position.
+  if (static_cast<int>(candidates.size()) < token_selector_.symbol_period()) return tokens;
+
+  std::vector<TokenCandidate> selected;
+  token_selector_.SelectTokens(candidates, &scores_table_, &selected);
+  for (const TokenCandidate& candidate : selected) {
+    std::vector<uint8_t> bytes = converter_.SymbolsToBytes(candidate.symbols);
+    // Symbols spelling a number beyond the byte space were never sent: the
+    // symbol space is larger, and only the caller can tell by the length.
+    if (static_cast<int>(bytes.size()) > params_.bytes_in_token) continue;
+    tokens.push_back({std::move(bytes), candidate.score});
+  }
+  return tokens;
+}
+
+}  // namespace audio_vesknet
