@@ -96,6 +96,54 @@ public final class TokenDecoder implements AutoCloseable {
     }
   }
 
+  /**
+   * A DTMF decoder for transmitters using {@code config}. The listening mode is a DSSS feature and
+   * is refused here.
+   *
+   * @throws IllegalArgumentException for the listening mode, or if the native library refuses the
+   *     envelope
+   */
+  public static TokenDecoder create(DtmfConfig config, DecoderOptions options) {
+    if (options.listeningMode()) {
+      throw new IllegalArgumentException("the listening mode hears DSSS transmitters only");
+    }
+    TABLE_LOCK.writeLock().lock();
+    try {
+      int id = USED_IDS.nextClearBit(0);
+      TokenDecoder decoder =
+          new TokenDecoder(
+              id, config.messageBytes(), config.crcCheckBytes(), options.channels(), false);
+      float[] envelope = config.envelope();
+      boolean built =
+          decoder.peer.nativeInitializeDtmf(
+              id,
+              config.tokenLengthBytes(),
+              config.checksumSymbol(),
+              config.sampleRate(),
+              config.basebandDecimationFactor(),
+              config.windowSeconds(),
+              config.tonesPerSymbol(),
+              0,
+              options.maxTokensPerCall(),
+              options.microphoneRate(),
+              options.channels(),
+              envelope[0],
+              envelope[1],
+              envelope[2],
+              envelope[3],
+              envelope[4],
+              options.bufferLengthTokens(),
+              config.toneFrequencies());
+      if (!built) {
+        throw new IllegalArgumentException("the native library refused the envelope");
+      }
+      USED_IDS.set(id);
+      return decoder;
+    } finally {
+      TABLE_LOCK.writeLock().unlock();
+    }
+  }
+
   /** Feeds interleaved 16-bit samples (all of {@code samples}). */
   public void process(short[] samples) {
     process(samples, 0, samples.length);

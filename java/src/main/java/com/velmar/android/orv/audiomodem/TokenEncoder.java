@@ -52,6 +52,37 @@ public final class TokenEncoder implements AutoCloseable {
     }
   }
 
+  /**
+   * A DTMF encoder for {@code config}; retires any previous encoder.
+   *
+   * @throws IllegalArgumentException if the native library refuses the envelope
+   */
+  public static TokenEncoder create(DtmfConfig config) {
+    synchronized (LOCK) {
+      TokenEncoder encoder = new TokenEncoder(config.messageBytes(), config.crcCheckBytes());
+      float[] envelope = config.envelope();
+      boolean built =
+          encoder.peer.nativeInitializeDtmf(
+              config.tokenLengthBytes(),
+              config.checksumSymbol(),
+              config.sampleRate(),
+              config.basebandDecimationFactor(),
+              config.windowSeconds(),
+              config.tonesPerSymbol(),
+              envelope[0],
+              envelope[1],
+              envelope[2],
+              envelope[3],
+              envelope[4],
+              config.toneFrequencies());
+      if (!built) {
+        throw new IllegalArgumentException("the native library refused the envelope");
+      }
+      current = encoder;
+      return encoder;
+    }
+  }
+
   /** Message bytes that {@link #encode} expects. */
   public int messageBytes() {
     return messageBytes;

@@ -1,0 +1,36 @@
+// The DTMF options shared by the vesk commands (selected with --dtmf).
+
+#ifndef TOOLS_VESK_DTMF_OPTIONS_H_
+#define TOOLS_VESK_DTMF_OPTIONS_H_
+
+#include <string>
+#include <vector>
+
+#include "social/tandry/audio/dtmf_waveform_config.h"
+#include "tools/vesk/option_parser.h"
+
+namespace vesk_tool {
+
+struct DtmfOptions {
+  bool dtmf = true;                          // Set by --dtmf, which selects these options.
+  audio_modem::DtmfWaveformConfig waveform;  // Product waveform (checksum symbol on).
+  bool crc = false;                          // Two CRC-16 bytes after the message.
+  std::string tones;                         // Comma-separated Hz; empty: the default ten-tone set.
+  std::string envelope;  // "attack,decay,sustain,release,level" seconds and level.
+};
+
+// Whether `args` ask for the DTMF modem (--dtmf).
+bool WantsDtmf(const std::vector<std::string>& args);
+
+// Registers --dtmf, --crc, --checksum-symbol, --coder-rate, --decimation,
+// --window, --tones-per-symbol, --tones and --envelope.
+void AddDtmfOptions(OptionParser* parser, DtmfOptions* options);
+
+// After parsing: reads the lists and validates. `message_bytes` (without
+// check bytes) sets the token length. Returns an empty string or what is
+// wrong.
+std::string FinishDtmfOptions(int message_bytes, DtmfOptions* options);
+
+}  // namespace vesk_tool
+
+#endif  // TOOLS_VESK_DTMF_OPTIONS_H_
