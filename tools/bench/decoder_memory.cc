@@ -3,7 +3,7 @@
 // tokens requested every 0.25 s). A bounded decoder shows flat figures once
 // its history is full.
 //
-//   decoder_memory [--minutes M] [--modem dsss|zintar] [--mic-rate HZ]
+//   decoder_memory [--minutes M] [--modem dsss|zintar|dtmf] [--mic-rate HZ]
 
 #include <malloc.h>
 
@@ -11,6 +11,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <fstream>
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -46,13 +47,22 @@ int main(int argc, char** argv) {
       rate = std::atoi(argv[i + 1]);
   }
   const long heap_before = HeapInUseKib();
-  audio_modem::DsssDecoderConfig config;
-  config.input_sample_rate = static_cast<float>(rate);
-  config.use_zintar = modem == "zintar";
-  const auto decoder = audio_modem::MakeDsssAudioModemDecoder(config);
+  std::unique_ptr<audio_modem::AudioModemDecoder> decoder;
   vesk_tool::StreamDecodingOptions options;
-  options.zintar = config.use_zintar;
-  vesk_tool::StreamDecoder stream(decoder.get(), rate, 1, 6, 2, options);
+  if (modem == "dtmf") {
+    audio_modem::DtmfDecoderConfig config;
+    config.input_sample_rate = static_cast<float>(rate);
+    decoder = audio_modem::MakeDtmfAudioModemDecoder(config);
+  } else {
+    audio_modem::DsssDecoderConfig config;
+    config.input_sample_rate = static_cast<float>(rate);
+    config.use_zintar = modem == "zintar";
+    options.zintar = config.use_zintar;
+    decoder = audio_modem::MakeDsssAudioModemDecoder(config);
+  }
+  // DSSS tokens: 6 bytes and CRC; DTMF tokens: 5 bytes and a checksum symbol.
+  vesk_tool::StreamDecoder stream(decoder.get(), rate, 1, modem == "dtmf" ? 5 : 6,
+                                  modem == "dtmf" ? 0 : 2, options);
 
   std::printf("### Memory of the %s decoder over %g minutes of %d Hz noise\n\n", modem.c_str(),
               minutes, rate);
