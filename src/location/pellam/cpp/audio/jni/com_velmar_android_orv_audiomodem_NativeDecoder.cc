@@ -116,16 +116,8 @@ Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDtmf(
   config.sustain_amplitude = sustain_amplitude;
   config.buffer_length_tokens = buffer_length_tokens;
 
-  const jsize num_tones = tone_frequencies == nullptr ? 0 : env->GetArrayLength(tone_frequencies);
-  if (env->ExceptionCheck()) return JNI_FALSE;
-  if (num_tones > 0) {
-    jfloat* elements = env->GetFloatArrayElements(tone_frequencies, nullptr);
-    if (elements != nullptr) {
-      config.tone_frequencies.assign(elements, elements + num_tones);
-      env->ReleaseFloatArrayElements(tone_frequencies, elements, 0);
-    }
-    if (elements == nullptr || env->ExceptionCheck()) return JNI_FALSE;
-  }
+  // An empty array keeps the default tone set.
+  if (!vesk_jni::ReadFloatArray(env, tone_frequencies, &config.tone_frequencies)) return JNI_FALSE;
 
   std::unique_ptr<AudioModemDecoder> decoder = audio_modem::MakeDtmfAudioModemDecoder(config);
   if (!decoder) return JNI_FALSE;

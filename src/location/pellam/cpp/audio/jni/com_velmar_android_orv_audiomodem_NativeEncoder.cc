@@ -86,16 +86,8 @@ Java_com_velmar_android_orv_audiomodem_NativeEncoder_nativeInitializeDtmf(
   config.release_time = release_time;
   config.sustain_amplitude = sustain_amplitude;
 
-  const jsize num_tones = tone_frequencies == nullptr ? 0 : env->GetArrayLength(tone_frequencies);
-  if (env->ExceptionCheck()) return JNI_FALSE;
-  if (num_tones > 0) {
-    jfloat* elements = env->GetFloatArrayElements(tone_frequencies, nullptr);
-    if (elements != nullptr) {
-      config.tone_frequencies.assign(elements, elements + num_tones);
-      env->ReleaseFloatArrayElements(tone_frequencies, elements, 0);
-    }
-    if (elements == nullptr || env->ExceptionCheck()) return JNI_FALSE;
-  }
+  // An empty array keeps the default tone set.
+  if (!vesk_jni::ReadFloatArray(env, tone_frequencies, &config.tone_frequencies)) return JNI_FALSE;
 
   std::unique_ptr<audio_modem::AudioModemEncoder> encoder =
       audio_modem::MakeDtmfAudioModemEncoder(config);

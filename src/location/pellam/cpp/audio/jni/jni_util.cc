@@ -13,6 +13,18 @@ jbyteArray ToJavaByteArray(JNIEnv* env, const std::vector<uint8_t>& bytes) {
   return array;
 }
 
+bool ReadFloatArray(JNIEnv* env, jfloatArray array, std::vector<float>* values) {
+  values->clear();
+  const jsize length = array == nullptr ? 0 : env->GetArrayLength(array);
+  if (env->ExceptionCheck()) return false;
+  if (length == 0) return true;
+  jfloat* elements = env->GetFloatArrayElements(array, nullptr);
+  if (elements == nullptr) return false;
+  values->assign(elements, elements + length);
+  env->ReleaseFloatArrayElements(array, elements, 0);
+  return !env->ExceptionCheck();
+}
+
 jmethodID FindCallback(JNIEnv* env, jobject receiver, const char* name, const char* signature) {
   if (receiver == nullptr) return nullptr;
   jclass receiver_class = env->GetObjectClass(receiver);

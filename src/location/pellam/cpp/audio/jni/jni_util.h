@@ -16,6 +16,10 @@ namespace vesk_jni {
 // or a Java exception is pending after the copy.
 jbyteArray ToJavaByteArray(JNIEnv* env, const std::vector<uint8_t>& bytes);
 
+// Replaces *values with the elements of `array` (null or empty: no elements).
+// False when the elements cannot be read or a Java exception is pending.
+bool ReadFloatArray(JNIEnv* env, jfloatArray array, std::vector<float>* values);
+
 // The instance method `name` with `signature` of `receiver`'s class, or null
 // when the receiver has no class or no such method. A failed lookup's
 // NoSuchMethodError is cleared and logged: the library never throws into Java.
