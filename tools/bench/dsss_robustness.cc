@@ -20,6 +20,7 @@
 #include <thread>
 #include <vector>
 
+#include "tools/bench/bench_util.h"
 #include "tools/bench/dsss_trial.h"
 
 namespace vesk_bench {
@@ -35,36 +36,9 @@ struct Options {
   audio_vesknet::VesknetDecoderParams tuning;
 };
 
-struct Point {
-  int successes = 0;
-  int wrong = 0;
-  std::vector<double> delays;
-};
-
-// Runs `trial` for seeds 1 .. n on several threads.
 Point RunPoint(const DsssTrial& trial, const Options& options) {
-  std::vector<TrialResult> results(options.seeds);
-  std::atomic<int> next{0};
-  std::vector<std::thread> workers;
-  for (int t = 0; t < options.threads; ++t) {
-    workers.emplace_back([&] {
-      for (int i; (i = next++) < options.seeds;) results[i] = RunDsssTrial(trial, i + 1);
-    });
-  }
-  for (std::thread& worker : workers) worker.join();
-  Point point;
-  for (const TrialResult& r : results) {
-    point.successes += r.correct;
-    point.wrong += r.wrong;
-    if (r.correct) point.delays.push_back(r.found_delay_s);
-  }
-  return point;
-}
-
-double Median(std::vector<double> values) {
-  if (values.empty()) return -1;
-  std::sort(values.begin(), values.end());
-  return values[values.size() / 2];
+  return Summarize(ForSeeds(options.seeds, options.threads,
+                            [&](uint64_t seed) { return RunDsssTrial(trial, seed); }));
 }
 
 struct Coder {
@@ -263,10 +237,6 @@ void HostTables(const Options& options) {
   }
 }
 
-bool Has(const Options& options, const char* table) {
-  return ("," + options.tables + ",").find(std::string(",") + table + ",") != std::string::npos;
-}
-
 }  // namespace
 }  // namespace vesk_bench
 
@@ -298,13 +268,13 @@ int main(int argc, char** argv) {
     }
   }
   using vesk_bench::DsssTrial;
-  if (vesk_bench::Has(options, "snr")) {
+  if (vesk_bench::HasItem(options.tables, "snr")) {
     std::vector<double> snrs;
     for (int s = -20; s <= 10; ++s) snrs.push_back(s);
     vesk_bench::Sweep("Success versus full-band SNR, token played 3 times, 44.1 kHz mic", "SNR dB",
                       snrs, options, [](double v, DsssTrial* t) { t->channel.snr_db = v; });
   }
-  if (vesk_bench::Has(options, "speed")) {
+  if (vesk_bench::HasItem(options.tables, "speed")) {
     vesk_bench::Sweep("Success versus speed (clock skew or Doppler) at 10 dB SNR", "speed",
                       {0.997, 0.998, 0.999, 1.0, 1.001, 1.002, 1.003}, options,
                       [](double v, DsssTrial* t) {
@@ -312,21 +282,21 @@ int main(int argc, char** argv) {
                         t->channel.snr_db = 10;
                       });
   }
-  if (vesk_bench::Has(options, "reverb")) {
+  if (vesk_bench::HasItem(options.tables, "reverb")) {
     vesk_bench::Sweep("Success with reverberation (RT60 0.3 s, D/R 3 dB)", "SNR dB",
                       {10, 0, -5, -10, -12, -15}, options, [](double v, DsssTrial* t) {
                         t->channel.snr_db = v;
                         t->channel.reverb = true;
                       });
   }
-  if (vesk_bench::Has(options, "mic48")) {
+  if (vesk_bench::HasItem(options.tables, "mic48")) {
     vesk_bench::Sweep("Success with a 48 kHz microphone", "SNR dB", {10, 0, -5, -10, -15, -17},
                       options, [](double v, DsssTrial* t) {
                         t->channel.snr_db = v;
                         t->channel.mic_rate = 48000;
                       });
   }
-  if (vesk_bench::Has(options, "unchecked")) {
+  if (vesk_bench::HasItem(options.tables, "unchecked")) {
     // What the CRC buys: without a check a token heard only in part, or
     // under noise, also comes out wrong.
     vesk_bench::Sweep("Without CRC: 8 unchecked bytes, one token per call", "SNR dB",
@@ -343,8 +313,8 @@ int main(int argc, char** argv) {
                         t->tuning.max_candidates_to_return = 1;
                       });
   }
-  if (vesk_bench::Has(options, "false")) vesk_bench::FalseTokens(options);
-  if (vesk_bench::Has(options, "tune")) vesk_bench::TuneRow(options, options.label);
-  if (vesk_bench::Has(options, "host")) vesk_bench::HostTables(options);
+  if (vesk_bench::HasItem(options.tables, "false")) vesk_bench::FalseTokens(options);
+  if (vesk_bench::HasItem(options.tables, "tune")) vesk_bench::TuneRow(options, options.label);
+  if (vesk_bench::HasItem(options.tables, "host")) vesk_bench::HostTables(options);
   return 0;
 }

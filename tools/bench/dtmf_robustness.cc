@@ -23,6 +23,7 @@
 #include <thread>
 #include <vector>
 
+#include "tools/bench/bench_util.h"
 #include "tools/bench/dtmf_trial.h"
 
 namespace vesk_bench {
@@ -39,36 +40,9 @@ struct Options {
   DtmfTrial base;               // Tuning and receiver overrides.
 };
 
-struct Point {
-  int successes = 0;
-  int wrong = 0;
-  std::vector<double> delays;
-};
-
-// Runs `trial` for seeds 1 .. n on several threads.
 Point RunPoint(const DtmfTrial& trial, const Options& options) {
-  std::vector<DtmfTrialResult> results(options.seeds);
-  std::atomic<int> next{0};
-  std::vector<std::thread> workers;
-  for (int t = 0; t < options.threads; ++t) {
-    workers.emplace_back([&] {
-      for (int i; (i = next++) < options.seeds;) results[i] = RunDtmfTrial(trial, i + 1);
-    });
-  }
-  for (std::thread& worker : workers) worker.join();
-  Point point;
-  for (const DtmfTrialResult& r : results) {
-    point.successes += r.correct;
-    point.wrong += r.wrong;
-    if (r.correct) point.delays.push_back(r.found_delay_s);
-  }
-  return point;
-}
-
-double Median(std::vector<double> values) {
-  if (values.empty()) return -1;
-  std::sort(values.begin(), values.end());
-  return values[values.size() / 2];
+  return Summarize(ForSeeds(options.seeds, options.threads,
+                            [&](uint64_t seed) { return RunDtmfTrial(trial, seed); }));
 }
 
 struct Window {
@@ -76,15 +50,11 @@ struct Window {
   DtmfWindow window;
 };
 
-bool Has(const std::string& list, const char* item) {
-  return ("," + list + ",").find(std::string(",") + item + ",") != std::string::npos;
-}
-
 std::vector<Window> Windows(const Options& options) {
   std::vector<Window> windows;
-  if (Has(options.windows, "product")) windows.push_back({"product", DtmfWindow::kConfigured});
-  if (Has(options.windows, "halfsine")) windows.push_back({"half-sine", DtmfWindow::kHalfSine});
-  if (Has(options.windows, "adsr")) windows.push_back({"ADSR 10/10/20/10", DtmfWindow::kAdsr});
+  if (HasItem(options.windows, "product")) windows.push_back({"product", DtmfWindow::kConfigured});
+  if (HasItem(options.windows, "halfsine")) windows.push_back({"half-sine", DtmfWindow::kHalfSine});
+  if (HasItem(options.windows, "adsr")) windows.push_back({"ADSR 10/10/20/10", DtmfWindow::kAdsr});
   return windows;
 }
 
@@ -105,7 +75,7 @@ void Sweep(const char* title, const char* variable, const std::vector<double>& v
       DtmfTrial trial = options.base;
       trial.window = w.window;
       trial.repeat = options.repeat;
-      trial.channel = DefaultDtmfTrialChannel();
+      trial.channel = DefaultTrialChannel();
       setup(value, &trial);
       const Point p = RunPoint(trial, options);
       std::printf(" %5.1f%% | %d | %.2f |", 100.0 * p.successes / options.seeds, p.wrong,
@@ -124,7 +94,7 @@ void FalseTokens(const Options& options) {
     std::printf("| %s |", babble ? "speech babble (3000 rms)" : "white noise (1000 rms)");
     for (int checksum = 1; checksum >= 0; --checksum) {
       DtmfTrial trial = options.base;
-      trial.channel = DefaultDtmfTrialChannel();
+      trial.channel = DefaultTrialChannel();
       trial.config.append_checksum_symbol = checksum != 0;
       std::printf(" %d |", CountDtmfFalseTokens(trial, 60.0 * options.false_minutes, babble != 0,
                                                 77 + babble));
@@ -170,13 +140,13 @@ int main(int argc, char** argv) {
   }
   using vesk_bench::DtmfTrial;
   const std::string& tables = options.tables;
-  if (vesk_bench::Has(tables, "snr")) {
+  if (vesk_bench::HasItem(tables, "snr")) {
     std::vector<double> snrs;
     for (int s = -20; s <= 10; ++s) snrs.push_back(s);
     vesk_bench::Sweep("Success versus full-band SNR, 44.1 kHz mic", "SNR dB", snrs, options,
                       [](double v, DtmfTrial* t) { t->channel.snr_db = v; });
   }
-  if (vesk_bench::Has(tables, "speed")) {
+  if (vesk_bench::HasItem(tables, "speed")) {
     const std::string title = "Success versus speed (clock skew or Doppler) at " +
                               std::to_string(static_cast<int>(options.speed_snr_db)) + " dB SNR";
     const double snr_db = options.speed_snr_db;
@@ -186,26 +156,26 @@ int main(int argc, char** argv) {
                         t->channel.snr_db = snr_db;
                       });
   }
-  if (vesk_bench::Has(tables, "reverb")) {
+  if (vesk_bench::HasItem(tables, "reverb")) {
     vesk_bench::Sweep("Success with reverberation (RT60 0.3 s, D/R 3 dB)", "SNR dB",
                       {10, 0, -5, -10, -12, -15, -17}, options, [](double v, DtmfTrial* t) {
                         t->channel.snr_db = v;
                         t->channel.reverb = true;
                       });
   }
-  if (vesk_bench::Has(tables, "babble")) {
+  if (vesk_bench::HasItem(tables, "babble")) {
     vesk_bench::Sweep("Success with speech babble (4 talkers), no other noise",
                       "signal-to-babble dB", {10, 6, 3, 0, -3, -6, -10}, options,
                       [](double v, DtmfTrial* t) { t->channel.babble_sir_db = v; });
   }
-  if (vesk_bench::Has(tables, "mic48")) {
+  if (vesk_bench::HasItem(tables, "mic48")) {
     vesk_bench::Sweep("Success with a 48 kHz microphone", "SNR dB", {10, 0, -5, -10, -15, -17},
                       options, [](double v, DtmfTrial* t) {
                         t->channel.snr_db = v;
                         t->channel.mic_rate = 48000;
                       });
   }
-  if (vesk_bench::Has(tables, "stereo")) {
+  if (vesk_bench::HasItem(tables, "stereo")) {
     vesk_bench::Sweep("Success with a stereo 48 kHz microphone (independent noise per channel)",
                       "SNR dB", {10, -10, -15, -17}, options, [](double v, DtmfTrial* t) {
                         t->channel.snr_db = v;
@@ -213,6 +183,6 @@ int main(int argc, char** argv) {
                         t->channel.channels = 2;
                       });
   }
-  if (vesk_bench::Has(tables, "false")) vesk_bench::FalseTokens(options);
+  if (vesk_bench::HasItem(tables, "false")) vesk_bench::FalseTokens(options);
   return 0;
 }

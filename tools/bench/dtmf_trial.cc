@@ -9,7 +9,6 @@
 #include "audio/vesknet/dtmf/dtmf_encoder.h"
 #include "base/logging.h"
 #include "social/tandry/audio/audio_modem_encoder.h"
-#include "tools/channel/babble.h"
 #include "tools/vesk/stream_decoding.h"
 
 namespace vesk_bench {
@@ -46,81 +45,29 @@ int MessageBytes(const DtmfTrial& trial) {
 
 }  // namespace
 
-vesk_channel::ChannelParams DefaultDtmfTrialChannel() {
-  vesk_channel::ChannelParams channel;
-  channel.lead_in_s = 0.5;
-  channel.max_random_lead_in_s = 1.0;
-  channel.tail_s = 1.0;
-  return channel;
-}
-
-DtmfTrialResult RunDtmfTrial(const DtmfTrial& trial, uint64_t seed) {
-  vesk_channel::Random random(vesk_channel::DeriveSeed(seed, 1000));
-  std::vector<uint8_t> message(MessageBytes(trial));
-  for (uint8_t& byte : message) byte = static_cast<uint8_t>(random.Next() & 0xFF);
-
+TrialResult RunDtmfTrial(const DtmfTrial& trial, uint64_t seed) {
+  const std::vector<uint8_t> message = RandomMessage(MessageBytes(trial), seed);
   const auto encoder = MakeEncoder(trial);
   std::vector<float> token, played;
   encoder->Encode(message, &token, trial.crc ? 2 : 0);
   for (int r = 0; r < trial.repeat; ++r) played.insert(played.end(), token.begin(), token.end());
-
-  vesk_channel::ChannelParams channel = trial.channel;
-  channel.seed = seed;
-  const vesk_channel::ChannelOutput heard =
-      vesk_channel::PlayThroughChannel(played, encoder->GetSampleRate(), channel);
-
-  const auto decoder = MakeDecoder(trial, heard.rate, heard.channels);
-  vesk_tool::StreamDecoder stream(decoder.get(), heard.rate, heard.channels, MessageBytes(trial),
-                                  trial.crc ? 2 : 0, vesk_tool::StreamDecodingOptions());
-  const std::vector<vesk_tool::FoundToken> found =
-      stream.Feed(heard.samples.data(), static_cast<int64_t>(heard.samples.size()));
-  DtmfTrialResult result;
-  const double start_s = heard.signal_start_exact / heard.rate;
-  for (const vesk_tool::FoundToken& t : found) {
-    if (t.bytes == message) {
-      if (!result.correct) result.found_delay_s = t.time_s - start_s;
-      result.correct = true;
-    } else {
-      ++result.wrong;
-    }
-  }
-  return result;
+  return DecodeOverTheAir(
+      played, encoder->GetSampleRate(), message, trial.crc ? 2 : 0, trial.channel, seed,
+      [&](int rate, int channels) { return MakeDecoder(trial, rate, channels); },
+      vesk_tool::StreamDecodingOptions());
 }
 
 int CountDtmfFalseTokens(const DtmfTrial& trial, double seconds, bool babble, uint64_t seed) {
   const int rate = trial.channel.mic_rate;
   const auto decoder = MakeDecoder(trial, rate, 1);
-  vesk_tool::StreamDecoder stream(decoder.get(), rate, 1, MessageBytes(trial), trial.crc ? 2 : 0,
-                                  vesk_tool::StreamDecodingOptions());
-  int found = 0;
-  // Generated in pieces to bound memory.
-  const double piece_s = 30.0;
-  for (int piece = 0; piece * piece_s < seconds; ++piece) {
-    const uint64_t piece_seed = vesk_channel::DeriveSeed(seed, static_cast<uint64_t>(piece));
-    std::vector<int16_t> samples;
-    if (babble) {
-      const std::vector<float> speech = vesk_channel::MakeBabble(piece_s, rate, 4, piece_seed);
-      for (const float s : speech) {
-        samples.push_back(
-            static_cast<int16_t>(std::max(-32768.0f, std::min(32767.0f, 3000.0f * s))));
-      }
-    } else {
-      samples = vesk_channel::MakeNoise(piece_s, rate, 1000.0, piece_seed);
-    }
-    found +=
-        static_cast<int>(stream.Feed(samples.data(), static_cast<int64_t>(samples.size())).size());
-  }
-  return found;
+  return CountFalseTokens(decoder.get(), rate, MessageBytes(trial), trial.crc ? 2 : 0, seconds,
+                          babble, seed, vesk_tool::StreamDecodingOptions());
 }
 
 bool SetDtmfTuning(const std::string& assignment, DtmfTrial* trial) {
-  const size_t equals = assignment.find('=');
-  if (equals == std::string::npos) return false;
-  const std::string name = assignment.substr(0, equals);
-  const char* text = assignment.c_str() + equals + 1;
-  char* end = nullptr;
-  const double value = std::strtod(text, &end);
-  if (end == text || *end != '\0') return false;
+  std::string name;
+  double value;
+  if (!ParseAssignment(assignment, &name, &value)) return false;
   const float real = static_cast<float>(value);
   const int whole = static_cast<int>(value);
   audio_vesknet::DtmfDecoderParams& t = trial->tuning;

@@ -1,6 +1,4 @@
-// One seeded over-the-air trial of the DTMF modem: encode a token, play it
-// through the simulated channel, decode the microphone stream as an app
-// would (4096-byte chunks, tokens requested every 0.25 s), and judge.
+// One seeded over-the-air trial of the DTMF modem (see trial.h).
 
 #ifndef TOOLS_BENCH_DTMF_TRIAL_H_
 #define TOOLS_BENCH_DTMF_TRIAL_H_
@@ -10,7 +8,7 @@
 
 #include "audio/vesknet/dtmf/dtmf_decoder.h"
 #include "social/tandry/audio/audio_modem_decoder.h"
-#include "tools/channel/channel_simulator.h"
+#include "tools/bench/trial.h"
 
 namespace vesk_bench {
 
@@ -32,17 +30,7 @@ struct DtmfTrial {
   bool crc = false;  // 3 message + 2 CRC bytes, or 5 raw bytes.
 };
 
-struct DtmfTrialResult {
-  bool correct = false;       // The sent token was reported.
-  int wrong = 0;              // Other tokens reported.
-  double found_delay_s = -1;  // From the signal's start to the first correct report.
-};
-
-// Channel defaults for trials: 0.5 s fixed plus up to 1 s random lead-in,
-// 1 s tail, 44.1 kHz mono, no noise.
-vesk_channel::ChannelParams DefaultDtmfTrialChannel();
-
-DtmfTrialResult RunDtmfTrial(const DtmfTrial& trial, uint64_t seed);
+TrialResult RunDtmfTrial(const DtmfTrial& trial, uint64_t seed);
 
 // Tokens reported from `seconds` of white noise (1000 rms) or speech babble
 // (3000 rms) alone, with the same decoding loop: every one is a false token.

@@ -16,6 +16,7 @@
 
 #include "social/tandry/audio/audio_modem_encoder.h"
 #include "social/tandry/audio/zintar_decoder.h"
+#include "tools/bench/bench_util.h"
 #include "tools/bench/dsss_trial.h"
 #include "tools/channel/babble.h"
 #include "tools/channel/channel_simulator.h"
@@ -64,20 +65,6 @@ double WakeDelay(const audio_modem::DsssWaveformConfig& waveform, double snr_db,
   return -1;
 }
 
-template <typename Fn>
-std::vector<double> ForSeeds(const Options& options, Fn fn) {
-  std::vector<double> values(options.seeds);
-  std::atomic<int> next{0};
-  std::vector<std::thread> workers;
-  for (int t = 0; t < options.threads; ++t) {
-    workers.emplace_back([&] {
-      for (int i; (i = next++) < options.seeds;) values[i] = fn(static_cast<uint64_t>(i + 1));
-    });
-  }
-  for (std::thread& w : workers) w.join();
-  return values;
-}
-
 void PrintWakeCell(const std::vector<double>& delays) {
   std::vector<double> woken;
   for (double d : delays) {
@@ -97,7 +84,7 @@ void WakeTable(const Options& options, const char* title, const char* variable,
   for (double v : values) {
     std::printf("| %g |", v);
     for (const auto& waveform : {audio_modem::DsssWaveformConfig(), audio_modem::Waveform44100()}) {
-      PrintWakeCell(ForSeeds(options, [&](uint64_t seed) {
+      PrintWakeCell(ForSeeds(options.seeds, options.threads, [&](uint64_t seed) {
         return sweep_speed ? WakeDelay(waveform, 10, v, seed) : WakeDelay(waveform, v, 1.0, seed);
       }));
       std::fflush(stdout);
@@ -149,19 +136,14 @@ void TokenTable(const Options& options) {
       trial.channel.mic_rate = kMicRate;
       trial.channel.snr_db = snr;
       trial.zintar = zintar;
-      const std::vector<double> ok = ForSeeds(
-          options, [&](uint64_t seed) { return RunDsssTrial(trial, seed).correct ? 1.0 : 0.0; });
-      int successes = 0;
-      for (double v : ok) successes += v > 0;
-      std::printf(" %d/%d |", successes, options.seeds);
+      const Point point = Summarize(ForSeeds(options.seeds, options.threads, [&](uint64_t seed) {
+        return RunDsssTrial(trial, seed);
+      }));
+      std::printf(" %d/%d |", point.successes, options.seeds);
       std::fflush(stdout);
     }
     std::printf("\n");
   }
-}
-
-bool Has(const Options& options, const char* table) {
-  return ("," + options.tables + ",").find(std::string(",") + table + ",") != std::string::npos;
 }
 
 }  // namespace
@@ -184,16 +166,16 @@ int main(int argc, char** argv) {
       return 2;
     }
   }
-  if (vesk_bench::Has(options, "detect")) {
+  if (vesk_bench::HasItem(options.tables, "detect")) {
     std::vector<double> snrs;
     for (int s = -20; s <= 10; s += 2) snrs.push_back(s);
     vesk_bench::WakeTable(options, "Wake-ups versus full-band SNR", "SNR dB", snrs, false);
   }
-  if (vesk_bench::Has(options, "speed")) {
+  if (vesk_bench::HasItem(options.tables, "speed")) {
     vesk_bench::WakeTable(options, "Wake-ups versus speed at 10 dB SNR", "speed",
                           {0.997, 0.998, 0.999, 0.9995, 1.0, 1.0005, 1.001, 1.002, 1.003}, true);
   }
-  if (vesk_bench::Has(options, "false")) vesk_bench::FalseWakes(options);
-  if (vesk_bench::Has(options, "tokens")) vesk_bench::TokenTable(options);
+  if (vesk_bench::HasItem(options.tables, "false")) vesk_bench::FalseWakes(options);
+  if (vesk_bench::HasItem(options.tables, "tokens")) vesk_bench::TokenTable(options);
   return 0;
 }

@@ -1,0 +1,91 @@
+#include "tools/bench/trial.h"
+
+#include <algorithm>
+#include <cstdlib>
+
+#include "tools/channel/babble.h"
+
+namespace vesk_bench {
+
+vesk_channel::ChannelParams DefaultTrialChannel() {
+  vesk_channel::ChannelParams channel;
+  channel.lead_in_s = 0.5;
+  channel.max_random_lead_in_s = 1.0;
+  channel.tail_s = 1.0;
+  return channel;
+}
+
+std::vector<uint8_t> RandomMessage(size_t bytes, uint64_t seed) {
+  vesk_channel::Random random(vesk_channel::DeriveSeed(seed, 1000));
+  std::vector<uint8_t> message(bytes);
+  for (uint8_t& byte : message) byte = static_cast<uint8_t>(random.Next() & 0xFF);
+  return message;
+}
+
+TrialResult DecodeOverTheAir(const std::vector<float>& played, float rate,
+                             const std::vector<uint8_t>& message, int crc_bytes,
+                             vesk_channel::ChannelParams channel, uint64_t seed,
+                             const DecoderFactory& make_decoder,
+                             const vesk_tool::StreamDecodingOptions& options) {
+  channel.seed = seed;
+  const vesk_channel::ChannelOutput heard = vesk_channel::PlayThroughChannel(played, rate, channel);
+  const auto decoder = make_decoder(heard.rate, heard.channels);
+  vesk_tool::StreamDecoder stream(decoder.get(), heard.rate, heard.channels,
+                                  static_cast<int>(message.size()), crc_bytes, options);
+  const std::vector<vesk_tool::FoundToken> found =
+      stream.Feed(heard.samples.data(), static_cast<int64_t>(heard.samples.size()));
+  TrialResult result;
+  const double start_s = heard.signal_start_exact / heard.rate;
+  for (const vesk_tool::FoundToken& token : found) {
+    if (token.bytes == message) {
+      if (!result.correct) result.found_delay_s = token.time_s - start_s;
+      result.correct = true;
+    } else {
+      ++result.wrong;
+    }
+  }
+  if (stream.broadcaster_time_s() >= 0) {
+    result.heard_delay_s = stream.broadcaster_time_s() - start_s;
+  }
+  return result;
+}
+
+int CountFalseTokens(audio_modem::AudioModemDecoder* decoder, int rate, int message_bytes,
+                     int crc_bytes, double seconds, bool babble, uint64_t seed,
+                     const vesk_tool::StreamDecodingOptions& options, double* detections) {
+  vesk_tool::StreamDecoder stream(decoder, rate, 1, message_bytes, crc_bytes, options);
+  int found = 0;
+  // Generated in pieces to bound memory over long runs.
+  const double piece_s = 30.0;
+  for (int piece = 0; piece * piece_s < seconds; ++piece) {
+    const uint64_t piece_seed = vesk_channel::DeriveSeed(seed, static_cast<uint64_t>(piece));
+    std::vector<int16_t> samples;
+    if (babble) {
+      for (const float s : vesk_channel::MakeBabble(piece_s, rate, 4, piece_seed)) {
+        samples.push_back(
+            static_cast<int16_t>(std::max(-32768.0f, std::min(32767.0f, 3000.0f * s))));
+      }
+    } else {
+      samples = vesk_channel::MakeNoise(piece_s, rate, 1000.0, piece_seed);
+    }
+    found +=
+        static_cast<int>(stream.Feed(samples.data(), static_cast<int64_t>(samples.size())).size());
+  }
+  if (detections != nullptr) {
+    *detections = static_cast<double>(stream.positive_broadcaster_answers()) /
+                  std::max(1, stream.broadcaster_answers());
+  }
+  return found;
+}
+
+bool ParseAssignment(const std::string& assignment, std::string* name, double* value) {
+  const size_t equals = assignment.find('=');
+  if (equals == std::string::npos) return false;
+  *name = assignment.substr(0, equals);
+  const char* text = assignment.c_str() + equals + 1;
+  char* end = nullptr;
+  *value = std::strtod(text, &end);
+  return end != text && *end == '\0';
+}
+
+}  // namespace vesk_bench
