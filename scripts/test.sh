@@ -27,7 +27,7 @@ for b in $BUILDS; do
   case $b in
     host) configure_and_build host ;;
     i686) configure_and_build i686 -DCMAKE_TOOLCHAIN_FILE=cmake/i686-linux-gnu.cmake \
-            -DVESK_BUILD_JAVA=OFF ;;
+            -DVESK_BUILD_JAVA=OFF -DVESK_BUILD_BENCHMARKS=OFF ;;
     sanitize) configure_and_build sanitize -DVESK_SANITIZE=ON -DVESK_BUILD_JAVA=OFF \
                 -DVESK_BUILD_BENCHMARKS=OFF ;;
     *) echo "unknown build: $b" >&2; exit 2 ;;
