@@ -4,9 +4,9 @@
 // 48 kHz microphone; and false tokens from long stretches of noise and
 // babble. Both coder configurations in use are measured.
 //
-//   dsss_robustness [--seeds N] [--threads N] [--tables
-//   snr,speed,reverb,mic48,unchecked,false,tune,host]
-//                   [--coder 44k|48k|both] [--set name=value ...]
+//   dsss_robustness [--seeds N] [--threads N] [--coder 44k|48k|both]
+//       [--tables snr,speed,reverb,mic48,unchecked,false,tune,host]
+//       [--set name=value,...]   (--help lists every option)
 //
 // --set overrides a decoder tuning field (see dsss_trial.cc), for measuring
 // the defaults themselves.
@@ -29,7 +29,7 @@ namespace {
 struct Options {
   int seeds = 20;
   int threads = 2;
-  std::string tables = "snr,speed,reverb,mic48,false";
+  std::string tables = "snr,speed,reverb,mic48,unchecked,false";
   std::string coder = "both";
   double false_minutes = 10.0;
   std::string label = "defaults";  // Row label of the tune table.
@@ -242,31 +242,28 @@ void HostTables(const Options& options) {
 
 int main(int argc, char** argv) {
   vesk_bench::Options options;
-  options.threads = std::max(1u, std::thread::hardware_concurrency());
-  for (int i = 1; i < argc; ++i) {
-    const std::string arg = argv[i];
-    const char* value = i + 1 < argc ? argv[i + 1] : "";
-    if (arg == "--seeds") {
-      options.seeds = std::atoi(value), ++i;
-    } else if (arg == "--threads") {
-      options.threads = std::max(1, std::atoi(value)), ++i;
-    } else if (arg == "--tables") {
-      options.tables = value, ++i;
-    } else if (arg == "--coder") {
-      options.coder = value, ++i;
-    } else if (arg == "--false-minutes") {
-      options.false_minutes = std::atof(value), ++i;
-    } else if (arg == "--set" && vesk_bench::SetTuning(value, &options.tuning)) {
-      options.label = options.label == "defaults" ? value : options.label + " " + value;
-      ++i;
-    } else {
-      std::fprintf(stderr,
-                   "usage: %s [--seeds N] [--threads N] [--tables LIST] "
-                   "[--coder 44k|48k|both] [--false-minutes M] [--set name=value]\n",
-                   argv[0]);
-      return 2;
-    }
+  options.threads = static_cast<int>(std::max(1u, std::thread::hardware_concurrency()));
+  float false_minutes = static_cast<float>(options.false_minutes);
+  std::string tuning;
+  vesk_tool::OptionParser parser;
+  parser.AddInt("seeds", &options.seeds, "seeds per table cell");
+  parser.AddInt("threads", &options.threads, "trials run at once");
+  parser.AddString("tables", &options.tables, "snr,speed,reverb,mic48,unchecked,false,tune,host");
+  parser.AddString("coder", &options.coder, "44k, 48k or both");
+  parser.AddFloat("false-minutes", &false_minutes, "minutes of noise and of babble");
+  parser.AddString("set", &tuning, "decoder tuning overrides: name=value,name=value");
+  const int status = vesk_bench::ParseArguments(
+      argc, argv, "Robustness of the DSSS modem on the channel simulator.", &parser);
+  if (status >= 0) return status;
+  options.seeds = std::max(1, options.seeds);
+  options.threads = std::max(1, options.threads);
+  options.false_minutes = false_minutes;
+  if (!vesk_bench::ApplyAssignments(tuning, [&](const std::string& assignment) {
+        return vesk_bench::SetTuning(assignment, &options.tuning);
+      })) {
+    return 2;
   }
+  if (!tuning.empty()) options.label = tuning;
   using vesk_bench::DsssTrial;
   if (vesk_bench::HasItem(options.tables, "snr")) {
     std::vector<double> snrs;

@@ -9,7 +9,7 @@
 //   dtmf_robustness [--seeds N] [--threads N] [--repeat N] [--false-minutes M]
 //                   [--speed-snr DB]
 //                   [--tables snr,speed,reverb,babble,mic48,stereo,false]
-//                   [--windows product,halfsine,adsr] [--set name=value ...]
+//                   [--windows product,halfsine,adsr] [--set name=value,...]
 //
 // --set overrides a decoder tuning or receiver field (see dtmf_trial.h), for
 // measuring the defaults themselves. Tokens are 5 raw bytes (no CRC) with the
@@ -109,34 +109,31 @@ void FalseTokens(const Options& options) {
 
 int main(int argc, char** argv) {
   vesk_bench::Options options;
-  options.threads = std::max(1u, std::thread::hardware_concurrency());
-  for (int i = 1; i < argc; ++i) {
-    const std::string arg = argv[i];
-    const char* value = i + 1 < argc ? argv[i + 1] : "";
-    if (arg == "--seeds") {
-      options.seeds = std::max(1, std::atoi(value)), ++i;
-    } else if (arg == "--threads") {
-      options.threads = std::max(1, std::atoi(value)), ++i;
-    } else if (arg == "--repeat") {
-      options.repeat = std::max(1, std::atoi(value)), ++i;
-    } else if (arg == "--tables") {
-      options.tables = value, ++i;
-    } else if (arg == "--windows") {
-      options.windows = value, ++i;
-    } else if (arg == "--false-minutes") {
-      options.false_minutes = std::atof(value), ++i;
-    } else if (arg == "--speed-snr") {
-      options.speed_snr_db = std::atof(value), ++i;
-    } else if (arg == "--set" && vesk_bench::SetDtmfTuning(value, &options.base)) {
-      ++i;
-    } else {
-      std::fprintf(stderr,
-                   "usage: %s [--seeds N] [--threads N] [--repeat N] [--tables LIST] "
-                   "[--windows product,halfsine,adsr] [--false-minutes M] [--speed-snr DB] "
-                   "[--set name=value]\n",
-                   argv[0]);
-      return 2;
-    }
+  options.threads = static_cast<int>(std::max(1u, std::thread::hardware_concurrency()));
+  float false_minutes = static_cast<float>(options.false_minutes);
+  float speed_snr_db = static_cast<float>(options.speed_snr_db);
+  std::string tuning;
+  vesk_tool::OptionParser parser;
+  parser.AddInt("seeds", &options.seeds, "seeds per table cell");
+  parser.AddInt("threads", &options.threads, "trials run at once");
+  parser.AddInt("repeat", &options.repeat, "token repetitions played");
+  parser.AddString("tables", &options.tables, "snr,speed,reverb,babble,mic48,stereo,false");
+  parser.AddString("windows", &options.windows, "product,halfsine,adsr");
+  parser.AddFloat("false-minutes", &false_minutes, "minutes of noise and of babble");
+  parser.AddFloat("speed-snr", &speed_snr_db, "SNR of the speed table, dB");
+  parser.AddString("set", &tuning, "tuning overrides: name=value,name=value");
+  const int status = vesk_bench::ParseArguments(
+      argc, argv, "Robustness of the DTMF modem on the channel simulator.", &parser);
+  if (status >= 0) return status;
+  options.seeds = std::max(1, options.seeds);
+  options.threads = std::max(1, options.threads);
+  options.repeat = std::max(1, options.repeat);
+  options.false_minutes = false_minutes;
+  options.speed_snr_db = speed_snr_db;
+  if (!vesk_bench::ApplyAssignments(tuning, [&](const std::string& assignment) {
+        return vesk_bench::SetDtmfTuning(assignment, &options.base);
+      })) {
+    return 2;
   }
   using vesk_bench::DtmfTrial;
   const std::string& tables = options.tables;

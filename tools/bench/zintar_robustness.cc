@@ -151,21 +151,19 @@ void TokenTable(const Options& options) {
 
 int main(int argc, char** argv) {
   vesk_bench::Options options;
-  options.threads = std::max(1u, std::thread::hardware_concurrency());
-  for (int i = 1; i < argc; ++i) {
-    const std::string arg = argv[i];
-    const char* value = i + 1 < argc ? argv[i + 1] : "";
-    if (arg == "--seeds") {
-      options.seeds = std::atoi(value), ++i;
-    } else if (arg == "--tables") {
-      options.tables = value, ++i;
-    } else if (arg == "--false-minutes") {
-      options.false_minutes = std::atof(value), ++i;
-    } else {
-      std::fprintf(stderr, "usage: %s [--seeds N] [--tables LIST] [--false-minutes M]\n", argv[0]);
-      return 2;
-    }
-  }
+  options.threads = static_cast<int>(std::max(1u, std::thread::hardware_concurrency()));
+  float false_minutes = static_cast<float>(options.false_minutes);
+  vesk_tool::OptionParser parser;
+  parser.AddInt("seeds", &options.seeds, "seeds per table cell");
+  parser.AddInt("threads", &options.threads, "trials run at once");
+  parser.AddString("tables", &options.tables, "detect,speed,false,tokens");
+  parser.AddFloat("false-minutes", &false_minutes, "minutes of noise and of babble");
+  const int status = vesk_bench::ParseArguments(
+      argc, argv, "The zintar listening mode on the channel simulator.", &parser);
+  if (status >= 0) return status;
+  options.seeds = std::max(1, options.seeds);
+  options.threads = std::max(1, options.threads);
+  options.false_minutes = false_minutes;
   if (vesk_bench::HasItem(options.tables, "detect")) {
     std::vector<double> snrs;
     for (int s = -20; s <= 10; s += 2) snrs.push_back(s);
