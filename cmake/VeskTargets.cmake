@@ -11,7 +11,7 @@ function(vesk_library name)
   target_link_libraries(${name} PUBLIC ${ARG_DEPS})
 endfunction()
 
-# vesk_test(<name> SOURCES <files...> DEPS <targets...> [LABELS <labels...>])
+# vesk_test(<name> SOURCES <files...> DEPS <targets...> [LABELS <label>])
 # A GoogleTest executable whose tests are registered with CTest one by one.
 function(vesk_test name)
   if(NOT VESK_BUILD_TESTS)
@@ -20,8 +20,13 @@ function(vesk_test name)
   cmake_parse_arguments(ARG "" "" "SOURCES;DEPS;LABELS" ${ARGN})
   add_executable(${name} ${ARG_SOURCES})
   target_link_libraries(${name} PRIVATE ${ARG_DEPS} GTest::gmock GTest::gtest GTest::gtest_main)
-  set(_labels unit ${ARG_LABELS})
-  gtest_discover_tests(${name} DISCOVERY_TIMEOUT 120 PROPERTIES LABELS "${_labels}")
+  # One label per test ("unit" unless given): discovered tests take their
+  # properties as plain key-value pairs.
+  set(_label unit)
+  if(ARG_LABELS)
+    list(GET ARG_LABELS 0 _label)
+  endif()
+  gtest_discover_tests(${name} DISCOVERY_TIMEOUT 120 PROPERTIES LABELS ${_label})
 endfunction()
 
 # vesk_benchmark(<name> SOURCES <files...> DEPS <targets...>)
