@@ -49,15 +49,9 @@ Java_com_velmar_android_orv_audiomodem_NativeEncoder_nativeInitializeDsss(
   config.token_length_bytes = token_length_bytes;
   config.append_checksum_symbol = append_checksum_symbol;
   config.single_sideband = single_sideband;
-  config.waveform.number_of_taps = number_of_taps;
-  config.waveform.code_number = code_number;
-  config.waveform.sample_rate = sample_rate;
-  config.waveform.upsampling_factor = upsampling_factor;
-  config.waveform.carrier_frequency = carrier_frequency;
-  config.waveform.bits_per_symbol = bits_per_symbol;
-  config.waveform.min_cycles_per_frame = min_cycles_per_frame;
-  config.waveform.baseband_decimation_factor = baseband_decimation_factor;
-  config.waveform.use_quadrature_carrier = use_quadrature_carrier;
+  config.waveform = vesk_jni::DsssWaveformFromJava(
+      number_of_taps, code_number, sample_rate, upsampling_factor, carrier_frequency,
+      bits_per_symbol, min_cycles_per_frame, baseband_decimation_factor, use_quadrature_carrier);
   config.broadcast_sample_rate = broadcast_sample_rate;
   config.transition_duration = transition_duration;
   InstallEncoder(audio_modem::MakeDsssAudioModemEncoder(config));

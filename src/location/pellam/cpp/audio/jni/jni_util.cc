@@ -13,6 +13,25 @@ jbyteArray ToJavaByteArray(JNIEnv* env, const std::vector<uint8_t>& bytes) {
   return array;
 }
 
+audio_modem::DsssWaveformConfig DsssWaveformFromJava(jint number_of_taps, jint code_number,
+                                                     jfloat sample_rate, jint upsampling_factor,
+                                                     jfloat carrier_frequency, jint bits_per_symbol,
+                                                     jint min_cycles_per_frame,
+                                                     jint baseband_decimation_factor,
+                                                     jboolean use_quadrature_carrier) {
+  audio_modem::DsssWaveformConfig waveform;
+  waveform.number_of_taps = number_of_taps;
+  waveform.code_number = code_number;
+  waveform.sample_rate = sample_rate;
+  waveform.upsampling_factor = upsampling_factor;
+  waveform.carrier_frequency = carrier_frequency;
+  waveform.bits_per_symbol = bits_per_symbol;
+  waveform.min_cycles_per_frame = min_cycles_per_frame;
+  waveform.baseband_decimation_factor = baseband_decimation_factor;
+  waveform.use_quadrature_carrier = use_quadrature_carrier;
+  return waveform;
+}
+
 bool ReadFloatArray(JNIEnv* env, jfloatArray array, std::vector<float>* values) {
   values->clear();
   const jsize length = array == nullptr ? 0 : env->GetArrayLength(array);
