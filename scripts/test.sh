@@ -5,13 +5,22 @@
 #            for the Android x86 ABI: the C++ suites;
 #   sanitize x86-64 under AddressSanitizer and UndefinedBehaviorSanitizer:
 #            the C++ suites.
-# Installs missing packages first. VESK_TEST_BUILDS="host i686" picks builds.
+# Installs missing packages first, only those the chosen builds need.
+# VESK_TEST_BUILDS="host i686" picks builds.
 set -euo pipefail
 cd "$(dirname "$0")/.."
-./scripts/setup.sh
 
 JOBS=${JOBS:-$(nproc)}
 BUILDS=${VESK_TEST_BUILDS:-host i686 sanitize}
+
+groups=(build test)
+for b in $BUILDS; do
+  case $b in
+    host) groups+=(java) ;;
+    i686) groups+=(i686) ;;
+  esac
+done
+./scripts/setup.sh "${groups[@]}"
 
 configure_and_build() {
   local dir=$1
