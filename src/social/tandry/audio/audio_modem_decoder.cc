@@ -7,6 +7,7 @@
 
 #include "audio/vesknet/crc16_coder.h"
 #include "base/logging.h"
+#include "social/tandry/audio/config_limits.h"
 
 namespace audio_modem {
 
@@ -77,6 +78,10 @@ int AudioModemDecoder::GetMaxSafeInputSize() const {
   return 0;
 }
 
+bool AudioModemDecoder::listening() const {
+  return kind_ == kZintar && zintar_decoder_->state() == ZintarDecoder::kListening;
+}
+
 bool AudioModemDecoder::GetTokens(DecodeResults* decode_results, int num_message_bytes,
                                   int num_crc_check_bytes) {
   CHECK(decode_results);
@@ -136,19 +141,42 @@ bool AudioModemDecoder::GetTokens(DecodeResults* decode_results, int num_message
   return !decode_results->tokens.empty();
 }
 
+namespace {
+
+// The checks of the microphone that both decoder kinds share.
+std::string MicrophoneError(float input_sample_rate, int num_channels) {
+  if (!(input_sample_rate >= 1000 && input_sample_rate <= kMaxSampleRateHz)) {
+    return "the microphone rate must lie in [1000, " + std::to_string(int(kMaxSampleRateHz)) +
+           "] Hz";
+  }
+  if (num_channels < 1 || num_channels > kMaxChannels) {
+    return "the microphone must have 1 to " + std::to_string(kMaxChannels) + " channels";
+  }
+  return std::string();
+}
+
+}  // namespace
+
 std::string DsssDecoderConfigError(const DsssDecoderConfig& config) {
-  if (config.token_length_bytes < 1) return "the token needs at least one byte";
+  if (config.token_length_bytes < 1 || config.token_length_bytes > kMaxTokenBytes) {
+    return "the token must have 1 to " + std::to_string(kMaxTokenBytes) + " bytes";
+  }
   const std::string waveform_error = DsssWaveformConfigError(config.waveform);
   if (!waveform_error.empty()) return waveform_error;
-  if (!(config.acquisition_window_seconds > 0)) return "the acquisition window must be positive";
+  if (!(config.acquisition_window_seconds > 0 && config.acquisition_window_seconds <= 60)) {
+    return "the acquisition window must lie in (0, 60] seconds";
+  }
   if (config.max_tokens_per_call < 1 ||
       config.max_tokens_per_call > audio_vesknet::VesknetDecoderParams().max_candidates_rank) {
     return "tokens per call must be 1 to " +
            std::to_string(audio_vesknet::VesknetDecoderParams().max_candidates_rank);
   }
-  if (!(config.input_sample_rate >= 1000)) return "the microphone rate must be at least 1000 Hz";
-  if (config.num_channels < 1) return "the microphone needs at least one channel";
-  if (!(config.buffer_length_tokens >= 1)) return "the buffer must hold at least one token";
+  const std::string microphone_error =
+      MicrophoneError(config.input_sample_rate, config.num_channels);
+  if (!microphone_error.empty()) return microphone_error;
+  if (!(config.buffer_length_tokens >= 1 && config.buffer_length_tokens <= 100)) {
+    return "the buffer must hold 1 to 100 tokens";
+  }
   if (config.use_zintar && ZintarDetectorHolder::Create(config.input_sample_rate, 1) == nullptr) {
     return "the zintar listening mode needs a microphone rate of at least 36994 Hz";
   }
@@ -160,7 +188,8 @@ std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(const DsssDecoderCo
 }
 
 std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
-    const DsssDecoderConfig& config, const audio_vesknet::VesknetDecoderParams& tuning) {
+    const DsssDecoderConfig& config, const audio_vesknet::VesknetDecoderParams& tuning,
+    ZintarDecoder::Clock clock) {
   std::unique_ptr<audio_vesknet::SymbolWaveCoder> coder = MakeSymbolWaveCoder(config.waveform);
   audio_vesknet::VesknetDecoderParams params = tuning;
   // Integer division first, as on the transmitting side.
@@ -180,7 +209,8 @@ std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
     // in the zintar decoder's check.
     decoder = std::make_unique<AudioModemDecoder>(std::make_unique<ZintarDecoder>(
         std::move(dsss_decoder),
-        ZintarDetectorHolder::Create(config.input_sample_rate, config.num_channels)));
+        ZintarDetectorHolder::Create(config.input_sample_rate, config.num_channels),
+        std::move(clock)));
   } else {
     decoder = std::make_unique<AudioModemDecoder>(std::move(dsss_decoder));
   }
@@ -194,14 +224,15 @@ std::string DtmfDecoderConfigError(const DtmfDecoderConfig& config) {
   if (config.max_tokens_per_call < 1 || config.max_tokens_per_call > kMaxDtmfTokensPerCall) {
     return "tokens per call must be 1 to " + std::to_string(kMaxDtmfTokensPerCall);
   }
-  if (!(config.input_sample_rate >= 1000)) return "the microphone rate must be at least 1000 Hz";
+  const std::string microphone_error =
+      MicrophoneError(config.input_sample_rate, config.num_channels);
+  if (!microphone_error.empty()) return microphone_error;
   // The resampler approximates the rate ratio by a fraction of denominator
   // 2000 at most.
   const float ratio = config.input_sample_rate / config.sample_rate;
   if (!(ratio >= 0.001f && ratio <= 1000.0f)) {
     return "the microphone rate must be within a factor 1000 of the sample rate";
   }
-  if (config.num_channels < 1) return "the microphone needs at least one channel";
   if (!(config.buffer_length_tokens >= 1 && config.buffer_length_tokens <= 100)) {
     return "the buffer must hold 1 to 100 tokens";
   }

@@ -17,8 +17,8 @@
 #include "audio/vesknet/dtmf/dtmf_decoder.h"
 #include "audio/vesknet/vesknet_decoder.h"
 #include "social/tandry/audio/dsss_waveform_config.h"
-#include "social/tandry/audio/zintar_decoder.h"
 #include "social/tandry/audio/dtmf_waveform_config.h"
+#include "social/tandry/audio/zintar_decoder.h"
 
 namespace audio_modem {
 
@@ -62,6 +62,9 @@ class AudioModemDecoder {
   // 16-bit samples (all channels) that the next block may hold without
   // dropping history.
   int GetMaxSafeInputSize() const;
+  // Whether only the listening mode's detector hears the input (the zintar
+  // kind before a wake-up or after falling back); false for other kinds.
+  bool listening() const;
 
   // Replaces the token list of *decode_results with the tokens heard, each of
   // num_message_bytes + num_crc_check_bytes bytes (0 or 2 check bytes, which
@@ -119,9 +122,11 @@ std::string DsssDecoderConfigError(const DsssDecoderConfig& config);
 std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(const DsssDecoderConfig& config);
 
 // As above, with the receiver's tuning taken from `tuning` wherever `config`
-// does not set it (for measurements of the tuning itself).
+// does not set it (for measurements of the tuning itself), and, for the
+// listening mode, `clock` as its fall-back timer (empty: the steady clock).
 std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
-    const DsssDecoderConfig& config, const audio_vesknet::VesknetDecoderParams& tuning);
+    const DsssDecoderConfig& config, const audio_vesknet::VesknetDecoderParams& tuning,
+    ZintarDecoder::Clock clock = ZintarDecoder::Clock());
 
 // Tokens per call a DTMF decoder configuration may ask for, as for DSSS.
 constexpr int kMaxDtmfTokensPerCall = 6;

@@ -105,6 +105,50 @@ TEST(AudioModemDecoderTest, ConfigErrors) {
   EXPECT_NE(DsssDecoderConfigError(config), "");
 }
 
+// Each bound of the configuration checks, just inside and just outside.
+TEST(AudioModemDecoderTest, ConfigLimitsAreInclusive) {
+  struct Case {
+    void (*set)(DsssDecoderConfig*, bool outside);
+    const char* error;
+  };
+  const Case cases[] = {
+      {[](DsssDecoderConfig* c, bool out) { c->token_length_bytes = out ? 257 : 256; },
+       "the token must have 1 to 256 bytes"},
+      {[](DsssDecoderConfig* c, bool out) { c->input_sample_rate = out ? 384001 : 384000; },
+       "the microphone rate must lie in [1000, 384000] Hz"},
+      {[](DsssDecoderConfig* c, bool out) { c->input_sample_rate = out ? 999 : 1000; },
+       "the microphone rate must lie in [1000, 384000] Hz"},
+      {[](DsssDecoderConfig* c, bool out) { c->num_channels = out ? 65 : 64; },
+       "the microphone must have 1 to 64 channels"},
+      {[](DsssDecoderConfig* c, bool out) { c->buffer_length_tokens = out ? 100.01f : 100; },
+       "the buffer must hold 1 to 100 tokens"},
+      {[](DsssDecoderConfig* c, bool out) { c->acquisition_window_seconds = out ? 60.01f : 60; },
+       "the acquisition window must lie in (0, 60] seconds"},
+      // 11 taps: 2047 chips x 32 = 65504 samples per frame; x 33 is too long.
+      {[](DsssDecoderConfig* c, bool out) {
+         c->waveform.number_of_taps = 11;
+         c->waveform.upsampling_factor = out ? 33 : 32;
+         c->waveform.baseband_decimation_factor = 1;
+       },
+       "a frame (code length x upsampling factor) may hold at most 65536 samples"},
+      {[](DsssDecoderConfig* c, bool out) { c->waveform.sample_rate = out ? 384001 : 384000; },
+       "the coder sample rate must lie in (0, 384000] Hz"},
+  };
+  for (const Case& c : cases) {
+    DsssDecoderConfig config;
+    c.set(&config, false);
+    EXPECT_EQ(DsssDecoderConfigError(config), "") << c.error;
+    c.set(&config, true);
+    EXPECT_EQ(DsssDecoderConfigError(config), c.error);
+  }
+  DtmfDecoderConfig dtmf;
+  dtmf.bytes_in_token = 257;
+  EXPECT_EQ(DtmfDecoderConfigError(dtmf), "the token must have 1 to 256 bytes");
+  dtmf = DtmfDecoderConfig();
+  dtmf.sample_rate = 384001;
+  EXPECT_EQ(DtmfDecoderConfigError(dtmf), "the sample rate must lie in (0, 384000] Hz");
+}
+
 TEST(AudioModemDecoderDeathTest, ChecksItsArguments) {
   EXPECT_DEATH(AudioModemDecoder(std::unique_ptr<audio_vesknet::VesknetDecoder>()),
                "Check failed: 'dsss_decoder' Must be non-null");
@@ -206,8 +250,8 @@ TEST(AudioModemDecoderTest, DtmfFactoryRefusalsAndTuning) {
   bad[3].buffer_length_tokens = 0.5f;
   bad[4].tones_per_symbol = 3;
   const std::vector<std::string> expected = {
-      "tokens per call must be 1 to 6", "the microphone rate must be at least 1000 Hz",
-      "the microphone needs at least one channel", "the buffer must hold 1 to 100 tokens",
+      "tokens per call must be 1 to 6", "the microphone rate must lie in [1000, 384000] Hz",
+      "the microphone must have 1 to 64 channels", "the buffer must hold 1 to 100 tokens",
       "the default tone set makes symbols of 2 tones"};
   for (size_t i = 0; i < bad.size(); ++i) EXPECT_EQ(DtmfDecoderConfigError(bad[i]), expected[i]);
 

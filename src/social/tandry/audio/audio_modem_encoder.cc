@@ -4,6 +4,7 @@
 
 #include "audio/vesknet/crc16_coder.h"
 #include "base/logging.h"
+#include "social/tandry/audio/config_limits.h"
 
 namespace audio_modem {
 
@@ -66,10 +67,19 @@ float AudioModemEncoder::GetSampleRate() const {
 }
 
 std::string DsssEncoderConfigError(const DsssEncoderConfig& config) {
-  if (config.token_length_bytes < 1) return "the token needs at least one byte";
+  if (config.token_length_bytes < 1 || config.token_length_bytes > kMaxTokenBytes) {
+    return "the token must have 1 to " + std::to_string(kMaxTokenBytes) + " bytes";
+  }
   const std::string waveform_error = DsssWaveformConfigError(config.waveform);
   if (!waveform_error.empty()) return waveform_error;
-  if (config.broadcast_sample_rate < 1) return "the broadcast sample rate must be positive";
+  if (config.broadcast_sample_rate < 1 || config.broadcast_sample_rate > kMaxSampleRateHz) {
+    return "the broadcast sample rate must lie in [1, " + std::to_string(int(kMaxSampleRateHz)) +
+           "] Hz";
+  }
+  if (!(config.waveform.carrier_frequency < config.broadcast_sample_rate / 2.0f)) {
+    return "the carrier (" + std::to_string(int(config.waveform.carrier_frequency)) +
+           " Hz) must lie below half the broadcast sample rate";
+  }
   if (!(config.transition_duration >= 0)) return "the transition must not be negative";
   return std::string();
 }

@@ -83,6 +83,16 @@ TEST(AudioModemEncoderTest, ConfigErrorsAreSentencesNotAborts) {
   config = DsssEncoderConfig();
   config.transition_duration = -1;
   EXPECT_NE(DsssEncoderConfigError(config), "");
+  // The carrier must fit below half the broadcast rate as well as the
+  // coder's: 18500 Hz needs a broadcast rate above 37000 Hz.
+  config = DsssEncoderConfig();
+  config.broadcast_sample_rate = 37001;
+  EXPECT_EQ(DsssEncoderConfigError(config), "");
+  config.broadcast_sample_rate = 37000;
+  EXPECT_EQ(DsssEncoderConfigError(config),
+            "the carrier (18500 Hz) must lie below half the broadcast sample rate");
+  config.broadcast_sample_rate = 384001;
+  EXPECT_EQ(DsssEncoderConfigError(config), "the broadcast sample rate must lie in [1, 384000] Hz");
 }
 
 TEST(AudioModemEncoderTest, DtmfProductConfiguration) {

@@ -1,6 +1,7 @@
 #include "social/tandry/audio/dsss_waveform_config.h"
 
 #include "audio/vesknet/code_signal_generator.h"
+#include "social/tandry/audio/config_limits.h"
 
 namespace audio_modem {
 
@@ -21,8 +22,16 @@ std::string DsssWaveformConfigError(const DsssWaveformConfig& config) {
     return "code number must be 0 to " + std::to_string(max_code_number) + " for " +
            std::to_string(config.number_of_taps) + " taps";
   }
-  if (!(config.sample_rate > 0)) return "the coder sample rate must be positive";
+  if (!(config.sample_rate > 0 && config.sample_rate <= kMaxSampleRateHz)) {
+    return "the coder sample rate must lie in (0, " + std::to_string(int(kMaxSampleRateHz)) +
+           "] Hz";
+  }
   if (config.upsampling_factor < 1) return "the upsampling factor must be positive";
+  const int code_length = (1 << config.number_of_taps) - 1;
+  if (config.upsampling_factor > kMaxDsssFrameSamples / code_length) {
+    return "a frame (code length x upsampling factor) may hold at most " +
+           std::to_string(kMaxDsssFrameSamples) + " samples";
+  }
   if (config.baseband_decimation_factor < 1) return "the decimation factor must be positive";
   if (config.upsampling_factor % config.baseband_decimation_factor != 0) {
     return "the upsampling factor must be a multiple of the decimation factor";

@@ -5,6 +5,8 @@
 #include <cstdint>
 #include <limits>
 
+#include "social/tandry/audio/config_limits.h"
+
 namespace audio_modem {
 
 namespace {
@@ -28,8 +30,12 @@ constexpr int64_t kMaxAlphabetSize = (1 << 30) / 256 + 1;
 }  // namespace
 
 std::string DtmfWaveformConfigError(const DtmfWaveformConfig& config) {
-  if (config.bytes_in_token < 1) return "the token needs at least one byte";
-  if (!(config.sample_rate > 0)) return "the sample rate must be positive";
+  if (config.bytes_in_token < 1 || config.bytes_in_token > kMaxTokenBytes) {
+    return "the token must have 1 to " + std::to_string(kMaxTokenBytes) + " bytes";
+  }
+  if (!(config.sample_rate > 0 && config.sample_rate <= kMaxSampleRateHz)) {
+    return "the sample rate must lie in (0, " + std::to_string(int(kMaxSampleRateHz)) + "] Hz";
+  }
   if (config.baseband_decimation_factor < 1) return "the decimation factor must be positive";
   if (!(config.window_duration > 0)) return "the symbol duration must be positive";
   audio_vesknet::DtmfEncoderParams params;

@@ -69,9 +69,13 @@ void ZintarDecoder::ProcessSamples(int16_t* samples, int count) {
   }
 
   // Keep the newest samples heard while listening; of a block longer than
-  // the history only its first kHistoryCapacity samples are kept.
-  const int take = std::min(kHistoryCapacity, count);
-  const int keep = std::min(kHistoryCapacity - take, history_count_);
+  // the history only its first samples are kept. The history holds whole
+  // frames, so that the DSSS decoder is handed whole frames whatever the
+  // channel count.
+  const int channels = zintar_detector_->num_channels();
+  const int capacity = HistoryFrames() * channels;
+  const int take = std::min(capacity, count - count % channels);
+  const int keep = std::min(capacity - take, history_count_);
   if (keep >= 1 && keep < history_count_) {
     std::memmove(history_.data(), history_.data() + history_count_ - keep, keep * sizeof(int16_t));
   }
@@ -80,7 +84,6 @@ void ZintarDecoder::ProcessSamples(int16_t* samples, int count) {
 
   // Mix down in place: the mean of the first two channels of each frame.
   int mono_count = count;
-  const int channels = zintar_detector_->num_channels();
   if (channels >= 2) {
     mono_count = 0;
     for (int i = 0; i + 1 < count; i += channels) {
@@ -121,8 +124,15 @@ bool ZintarDecoder::GetToken(audio_vesknet::VesknetDecodeResults* results) {
 
 void ZintarDecoder::WipeInternalData() { dsss_decoder_->WipeInternalData(); }
 
+int ZintarDecoder::HistoryFrames() const {
+  return kHistoryCapacity / zintar_detector_->num_channels();
+}
+
 int ZintarDecoder::GetMaxSafeInputSize() const {
-  const int frames = dsss_decoder_->max_buffer_size() - dsss_decoder_->buffered_input_frames();
+  int frames = dsss_decoder_->max_buffer_size() - dsss_decoder_->buffered_input_frames();
+  // While listening, a block that wakes the decoder reaches it only through
+  // the history.
+  if (state_ == kListening) frames = std::min(frames, HistoryFrames());
   return std::max(0, frames) * dsss_decoder_->num_channels();
 }
 

@@ -68,7 +68,7 @@ class ZintarDecoder {
   // Forwarded to the DSSS decoder (the detector was configured at creation).
   void Initialize(float sample_rate, int num_channels);
 
-  // Interleaved 16-bit samples. While listening, a multi-channel block is
+  // Interleaved 16-bit samples, whole frames. While listening, a multi-channel block is
   // mixed down in place (the first two channels of each frame averaged), so
   // `samples` is overwritten.
   void ProcessSamples(int16_t* samples, int count);
@@ -81,7 +81,9 @@ class ZintarDecoder {
 
   // Wipes the DSSS decoder; the listening state, history and detector stay.
   void WipeInternalData();
-  // The DSSS decoder's free buffer space, in 16-bit samples (all channels).
+  // 16-bit samples (all channels) that the next block may hold without
+  // losing any: the DSSS decoder's free buffer space, and while listening at
+  // most the history, through which a waking block reaches the decoder.
   int GetMaxSafeInputSize() const;
   // Bytes per token of the DSSS decoder.
   int token_size() const;
@@ -95,6 +97,8 @@ class ZintarDecoder {
 
  private:
   void ApplyActivityRule(bool answer);
+  // Whole frames the history holds: as many as fit in kHistoryCapacity.
+  int HistoryFrames() const;
 
   std::unique_ptr<audio_vesknet::VesknetDecoder> dsss_decoder_;
   std::unique_ptr<ZintarDetectorHolder> zintar_detector_;

@@ -134,6 +134,30 @@ TEST(ZintarDecoderTest, MixesChannelsDownInPlaceWhileListening) {
   EXPECT_EQ(negative[0], -1);
 }
 
+TEST(ZintarDecoderTest, HistoryHoldsWholeFramesForAnyChannelCount) {
+  // 7 channels do not divide the 14400-sample history: it holds 2057 frames
+  // (14399 samples), and a wake-up hands the DSSS decoder whole frames.
+  Fixture seven(7);
+  EXPECT_EQ(seven.decoder->GetMaxSafeInputSize(), 2057 * 7);
+  std::vector<int16_t> pcm;
+  for (const int16_t s : ProductTransmission()) pcm.insert(pcm.end(), 7, s);
+  const int block = 7 * 1000;
+  size_t start = 0;
+  while (seven.decoder->state() == ZintarDecoder::kListening && start + block <= pcm.size()) {
+    std::vector<int16_t> chunk(pcm.begin() + start, pcm.begin() + start + block);
+    seven.decoder->ProcessSamples(chunk.data(), block);
+    start += block;
+  }
+  ASSERT_EQ(seven.decoder->state(), ZintarDecoder::kDetected);
+  // The history went over as the decoder's first block: about 2057 frames
+  // (its count is rounded to baseband samples).
+  const int held = seven.decoder->dsss_decoder().buffered_input_frames();
+  EXPECT_GT(held, 2057 - 100);
+  EXPECT_LE(held, 2057 + 10);
+  // Once awake, the safe size is the DSSS decoder's free space alone.
+  EXPECT_GT(seven.decoder->GetMaxSafeInputSize(), 2057 * 7);
+}
+
 TEST(ZintarDecoderTest, NoDetectorBelowTheCentreFrequency) {
   EXPECT_EQ(ZintarDetectorHolder::Create(36000, 1), nullptr);
   EXPECT_NE(ZintarDetectorHolder::Create(44100, 1), nullptr);
