@@ -135,9 +135,9 @@ typedef struct vesk_dtmf_waveform {
 /* A modem and its token layout. Fill it with vesk_config_defaults(). */
 typedef struct vesk_config {
   vesk_modem modem;
-  int message_bytes;   /* Message bytes per token, >= 1 (DSSS 6, DTMF 5). */
-  int crc_check_bytes; /* CRC-16 bytes after the message, 0 or 2 (DSSS 2, DTMF 0). */
-  int checksum_symbol; /* A checksum symbol ends the token, 0 or 1 (DSSS 0, DTMF 1). */
+  int message_bytes;       /* Message bytes per token, >= 1 (DSSS 6, DTMF 5). */
+  int crc_check_bytes;     /* CRC-16 bytes after the message, 0 or 2 (DSSS 2, DTMF 0). */
+  int checksum_symbol;     /* A checksum symbol ends the token, 0 or 1 (DSSS 0, DTMF 1). */
   vesk_dsss_waveform dsss; /* Used when modem is VESK_MODEM_DSSS. */
   vesk_dtmf_waveform dtmf; /* Used when modem is VESK_MODEM_DTMF. */
 } vesk_config;
@@ -176,7 +176,7 @@ typedef struct vesk_encoder vesk_encoder;
    DTMF) followed by one repetition of the token. To repeat a token, play the
    transition once and the token part as often as wanted. */
 typedef struct vesk_pcm {
-  int16_t* samples;          /* transition_samples + token_samples samples. */
+  int16_t* samples; /* transition_samples + token_samples samples. */
   size_t num_samples;
   size_t transition_samples; /* The first samples: the fade-in. */
   size_t token_samples;      /* The token itself. */

@@ -16,6 +16,7 @@
 
 #include "base/logging.h"
 #include "location/pellam/cpp/audio/jni/decoder_registry.h"
+#include "location/pellam/cpp/audio/jni/jni_entry_points.h"
 #include "location/pellam/cpp/audio/jni/jni_util.h"
 #include "social/tandry/audio/audio_modem_decoder.h"
 

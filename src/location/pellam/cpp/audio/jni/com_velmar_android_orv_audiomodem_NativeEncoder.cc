@@ -14,6 +14,7 @@
 
 #include "audio/dsp/pcm_conversion.h"
 #include "base/logging.h"
+#include "location/pellam/cpp/audio/jni/jni_entry_points.h"
 #include "location/pellam/cpp/audio/jni/jni_util.h"
 #include "social/tandry/audio/audio_modem_encoder.h"
 

@@ -1,0 +1,33 @@
+# Fails unless LIBRARY's dynamic symbol table defines exactly the functions
+# that HEADER declares with VESK_API.
+file(READ ${HEADER} header)
+string(REGEX MATCHALL "VESK_API[^;(]*[ *](vesk_[a-z0-9_]+)\\(" declarations "${header}")
+set(expected)
+foreach(declaration ${declarations})
+  string(REGEX MATCH "(vesk_[a-z0-9_]+)\\($" name "${declaration}")
+  list(APPEND expected ${CMAKE_MATCH_1})
+endforeach()
+list(SORT expected)
+
+execute_process(COMMAND ${NM} -D --defined-only ${LIBRARY} OUTPUT_VARIABLE symbols
+                RESULT_VARIABLE status)
+if(NOT status EQUAL 0)
+  message(FATAL_ERROR "nm failed on ${LIBRARY}")
+endif()
+string(REGEX MATCHALL "[^\n]+" lines "${symbols}")
+set(exported)
+foreach(line ${lines})
+  # "address type name"; the linker's own markers are not the library's.
+  if(line MATCHES "^[0-9a-f]+ [A-Za-z] ([^ ]+)$")
+    set(symbol ${CMAKE_MATCH_1})
+    if(NOT symbol MATCHES "^(_edata|_end|__bss_start|_init|_fini)$")
+      list(APPEND exported ${symbol})
+    endif()
+  endif()
+endforeach()
+list(SORT exported)
+if(NOT exported STREQUAL expected)
+  message(FATAL_ERROR "libvesk exports\n  ${exported}\nbut its header declares\n  ${expected}")
+endif()
+list(LENGTH expected count)
+message(STATUS "libvesk exports the ${count} functions of vesk/vesk.h and nothing else")
