@@ -152,7 +152,7 @@ std::unique_ptr<audio_modem::AudioModemEncoder> MakeEncoder(const vesk_config& c
   return encoder;
 }
 
-std::string OptionsError(const vesk_decoder_options& options, vesk_modem modem) {
+std::string OptionsError(const vesk_decoder_options& options, int modem) {
   if (!IsFlag(options.listening_mode)) return "listening_mode must be 0 or 1";
   if (!IsFlag(options.design_baseband_filter)) return "design_baseband_filter must be 0 or 1";
   if (options.listening_mode && modem != VESK_MODEM_DSSS) {
@@ -229,7 +229,7 @@ extern "C" {
 
 const char* vesk_version(void) { return VESK_VERSION_STRING; }
 
-const char* vesk_status_name(vesk_status status) {
+const char* vesk_status_name(int status) {
   switch (status) {
     case VESK_OK:
       return "VESK_OK";
@@ -249,7 +249,7 @@ const char* vesk_status_name(vesk_status status) {
 
 const char* vesk_last_error(void) { return last_error.c_str(); }
 
-vesk_status vesk_config_defaults(vesk_config* config, vesk_modem modem) {
+vesk_status vesk_config_defaults(vesk_config* config, int modem) {
   if (config == nullptr) return Fail(VESK_ERROR_ARGUMENT, "config is NULL");
   if (modem != VESK_MODEM_DSSS && modem != VESK_MODEM_DTMF) {
     return Fail(VESK_ERROR_ARGUMENT, "modem must be VESK_MODEM_DSSS or VESK_MODEM_DTMF");

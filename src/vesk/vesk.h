@@ -74,8 +74,9 @@ typedef enum vesk_status {
   VESK_ERROR_INTERNAL = 5
 } vesk_status;
 
-/* A fixed name for a status, such as "VESK_ERROR_CONFIG". */
-VESK_API const char* vesk_status_name(vesk_status status);
+/* A fixed name for a status, such as "VESK_ERROR_CONFIG". (Plain ints here
+   and in the records, so that any value a caller passes is well defined.) */
+VESK_API const char* vesk_status_name(int status);
 
 /*
  * Why the calling thread's most recent failing vesk call failed, in a
@@ -134,7 +135,7 @@ typedef struct vesk_dtmf_waveform {
 
 /* A modem and its token layout. Fill it with vesk_config_defaults(). */
 typedef struct vesk_config {
-  vesk_modem modem;
+  int modem;               /* A vesk_modem. */
   int message_bytes;       /* Message bytes per token, >= 1 (DSSS 6, DTMF 5). */
   int crc_check_bytes;     /* CRC-16 bytes after the message, 0 or 2 (DSSS 2, DTMF 0). */
   int checksum_symbol;     /* A checksum symbol ends the token, 0 or 1 (DSSS 0, DTMF 1). */
@@ -144,7 +145,7 @@ typedef struct vesk_config {
 
 /* Fills *config with the product defaults of `modem` (both waveforms are
    filled; only the modem's own is used). */
-VESK_API vesk_status vesk_config_defaults(vesk_config* config, vesk_modem modem);
+VESK_API vesk_status vesk_config_defaults(vesk_config* config, int modem);
 
 /* How a decoder listens. Fill it with vesk_decoder_options_defaults(). */
 typedef struct vesk_decoder_options {

@@ -199,7 +199,7 @@ TEST(VeskCTest, RefusedConfigurationsSayWhy) {
   const float inf = std::numeric_limits<float>::infinity();
   static const float kLoudTones[] = {1000, 2000, 22050};
   const std::vector<Case> cases = {
-      {VESK_MODEM_DSSS, [](auto* c, auto*) { c->modem = static_cast<vesk_modem>(7); }, "modem"},
+      {VESK_MODEM_DSSS, [](auto* c, auto*) { c->modem = 7; }, "modem"},
       {VESK_MODEM_DSSS, [](auto* c, auto*) { c->message_bytes = 0; }, "message_bytes"},
       {VESK_MODEM_DSSS, [](auto* c, auto*) { c->message_bytes = 255; }, "message_bytes"},
       {VESK_MODEM_DSSS, [](auto* c, auto*) { c->crc_check_bytes = 1; }, "crc_check_bytes"},
@@ -312,7 +312,7 @@ TEST(VeskCTest, NullPointersAndWrongLengthsAreArgumentErrors) {
   double seconds = 0;
   const std::vector<std::function<vesk_status()>> calls = {
       [&] { return vesk_config_defaults(nullptr, VESK_MODEM_DSSS); },
-      [&] { return vesk_config_defaults(&scratch, static_cast<vesk_modem>(-1)); },
+      [&] { return vesk_config_defaults(&scratch, -1); },
       [&] { return vesk_decoder_options_defaults(nullptr); },
       [&] { return vesk_encoder_create(nullptr, &encoder); },
       [&] { return vesk_encoder_create(&config, nullptr); },
@@ -342,6 +342,7 @@ TEST(VeskCTest, NullPointersAndWrongLengthsAreArgumentErrors) {
     EXPECT_STRNE(vesk_last_error(), "") << "call " << i;
   }
   EXPECT_STREQ(vesk_status_name(VESK_ERROR_ARGUMENT), "VESK_ERROR_ARGUMENT");
+  EXPECT_STREQ(vesk_status_name(-3), "unknown status");
   // Zero samples are no error, and nothing happens.
   EXPECT_EQ(vesk_decoder_process(decoder, nullptr, 0), VESK_OK);
   EXPECT_STREQ(vesk_last_error(), "");
