@@ -39,3 +39,18 @@ function(vesk_benchmark name)
   add_executable(${name} ${ARG_SOURCES})
   target_link_libraries(${name} PRIVATE ${ARG_DEPS} benchmark::benchmark benchmark::benchmark_main)
 endfunction()
+
+# vesk_fuzzer(<name> SOURCES <files...> DEPS <targets...>)
+# A libFuzzer target, built only with VESK_FUZZ; scripts/fuzz.sh runs it with
+# the seed corpus in <name>_corpus/ beside its source.
+function(vesk_fuzzer name)
+  if(NOT VESK_FUZZ)
+    return()
+  endif()
+  cmake_parse_arguments(ARG "" "" "SOURCES;DEPS" ${ARGN})
+  add_executable(${name} ${ARG_SOURCES})
+  target_link_libraries(${name} PRIVATE ${ARG_DEPS})
+  target_link_options(${name} PRIVATE -fsanitize=fuzzer)
+  set_property(GLOBAL APPEND PROPERTY VESK_FUZZERS
+               "${name}=${CMAKE_CURRENT_SOURCE_DIR}/${name}_corpus")
+endfunction()

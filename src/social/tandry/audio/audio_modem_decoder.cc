@@ -155,6 +155,22 @@ std::string MicrophoneError(float input_sample_rate, int num_channels) {
   return std::string();
 }
 
+// The checks that the history a decoder keeps stays within bounds.
+std::string HistoryError(double token_seconds, float buffer_length_tokens) {
+  if (token_seconds > kMaxTokenSeconds) {
+    return "a token may last at most " + std::to_string(static_cast<int>(kMaxTokenSeconds)) +
+           " s on air";
+  }
+  if (!(buffer_length_tokens >= 1 && buffer_length_tokens <= 100)) {
+    return "the buffer must hold 1 to 100 tokens";
+  }
+  if (token_seconds * buffer_length_tokens > kMaxHistorySeconds) {
+    return "the history (buffer length x token duration) may last at most " +
+           std::to_string(static_cast<int>(kMaxHistorySeconds)) + " s";
+  }
+  return std::string();
+}
+
 }  // namespace
 
 std::string DsssDecoderConfigError(const DsssDecoderConfig& config) {
@@ -174,9 +190,10 @@ std::string DsssDecoderConfigError(const DsssDecoderConfig& config) {
   const std::string microphone_error =
       MicrophoneError(config.input_sample_rate, config.num_channels);
   if (!microphone_error.empty()) return microphone_error;
-  if (!(config.buffer_length_tokens >= 1 && config.buffer_length_tokens <= 100)) {
-    return "the buffer must hold 1 to 100 tokens";
-  }
+  const std::string history_error = HistoryError(
+      DsssTokenSeconds(config.waveform, config.token_length_bytes, config.use_checksum_symbol),
+      config.buffer_length_tokens);
+  if (!history_error.empty()) return history_error;
   if (config.use_zintar && ZintarDetectorHolder::Create(config.input_sample_rate, 1) == nullptr) {
     return "the zintar listening mode needs a microphone rate of at least 36994 Hz";
   }
@@ -233,10 +250,7 @@ std::string DtmfDecoderConfigError(const DtmfDecoderConfig& config) {
   if (!(ratio >= 0.001f && ratio <= 1000.0f)) {
     return "the microphone rate must be within a factor 1000 of the sample rate";
   }
-  if (!(config.buffer_length_tokens >= 1 && config.buffer_length_tokens <= 100)) {
-    return "the buffer must hold 1 to 100 tokens";
-  }
-  return std::string();
+  return HistoryError(DtmfTokenSeconds(config), config.buffer_length_tokens);
 }
 
 std::unique_ptr<AudioModemDecoder> MakeDtmfAudioModemDecoder(const DtmfDecoderConfig& config) {

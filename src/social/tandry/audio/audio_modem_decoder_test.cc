@@ -112,15 +112,33 @@ TEST(AudioModemDecoderTest, ConfigLimitsAreInclusive) {
     const char* error;
   };
   const Case cases[] = {
-      {[](DsssDecoderConfig* c, bool out) { c->token_length_bytes = out ? 257 : 256; },
+      {[](DsssDecoderConfig* c, bool out) {
+         c->token_length_bytes = out ? 257 : 256;
+         c->buffer_length_tokens = 1;
+       },
        "the token must have 1 to 256 bytes"},
+      // One bit per symbol: 1 + 8 x 88 frames of 2032 / 48000 s last 29.8 s;
+      // 89 bytes last 30.2 s.
+      {[](DsssDecoderConfig* c, bool out) {
+         c->waveform.bits_per_symbol = 1;
+         c->token_length_bytes = out ? 89 : 88;
+         c->buffer_length_tokens = 1;
+       },
+       "a token may last at most 30 s on air"},
+      // The product token lasts 17 x 2032 / 48000 = 0.7197 s: 83 of them
+      // 59.7 s, 84 of them 60.5 s.
+      {[](DsssDecoderConfig* c, bool out) { c->buffer_length_tokens = out ? 84 : 83; },
+       "the history (buffer length x token duration) may last at most 60 s"},
       {[](DsssDecoderConfig* c, bool out) { c->input_sample_rate = out ? 384001 : 384000; },
        "the microphone rate must lie in [1000, 384000] Hz"},
       {[](DsssDecoderConfig* c, bool out) { c->input_sample_rate = out ? 999 : 1000; },
        "the microphone rate must lie in [1000, 384000] Hz"},
       {[](DsssDecoderConfig* c, bool out) { c->num_channels = out ? 65 : 64; },
        "the microphone must have 1 to 64 channels"},
-      {[](DsssDecoderConfig* c, bool out) { c->buffer_length_tokens = out ? 100.01f : 100; },
+      {[](DsssDecoderConfig* c, bool out) {
+         c->token_length_bytes = 1;
+         c->buffer_length_tokens = out ? 100.01f : 100;
+       },
        "the buffer must hold 1 to 100 tokens"},
       {[](DsssDecoderConfig* c, bool out) { c->acquisition_window_seconds = out ? 60.01f : 60; },
        "the acquisition window must lie in (0, 60] seconds"},
@@ -129,6 +147,7 @@ TEST(AudioModemDecoderTest, ConfigLimitsAreInclusive) {
          c->waveform.number_of_taps = 11;
          c->waveform.upsampling_factor = out ? 33 : 32;
          c->waveform.baseband_decimation_factor = 1;
+         c->buffer_length_tokens = 1;
        },
        "a frame (code length x upsampling factor) may hold at most 65536 samples"},
       {[](DsssDecoderConfig* c, bool out) { c->waveform.sample_rate = out ? 384001 : 384000; },
@@ -147,6 +166,15 @@ TEST(AudioModemDecoderTest, ConfigLimitsAreInclusive) {
   dtmf = DtmfDecoderConfig();
   dtmf.sample_rate = 384001;
   EXPECT_EQ(DtmfDecoderConfigError(dtmf), "the sample rate must lie in (0, 384000] Hz");
+  // 256 bytes are 376 digits in base 44, plus the spacer and the checksum:
+  // 378 symbols of 3312 samples (0.075 s) last 28.4 s, of 3536 (0.08 s) 30.3 s.
+  DtmfEncoderConfig long_token;
+  long_token.bytes_in_token = 256;
+  long_token.window_duration = 0.075f;
+  EXPECT_NEAR(DtmfTokenSeconds(long_token), 378 * 3312 / 44100.0, 1e-9);
+  EXPECT_EQ(DtmfEncoderConfigError(long_token), "");
+  long_token.window_duration = 0.08f;
+  EXPECT_EQ(DtmfEncoderConfigError(long_token), "a token may last at most 30 s on air");
 }
 
 TEST(AudioModemDecoderDeathTest, ChecksItsArguments) {

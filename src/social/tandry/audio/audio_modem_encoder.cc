@@ -72,6 +72,11 @@ std::string DsssEncoderConfigError(const DsssEncoderConfig& config) {
   }
   const std::string waveform_error = DsssWaveformConfigError(config.waveform);
   if (!waveform_error.empty()) return waveform_error;
+  if (DsssTokenSeconds(config.waveform, config.token_length_bytes, config.append_checksum_symbol) >
+      kMaxTokenSeconds) {
+    return "a token may last at most " + std::to_string(static_cast<int>(kMaxTokenSeconds)) +
+           " s on air";
+  }
   if (config.broadcast_sample_rate < 1 || config.broadcast_sample_rate > kMaxSampleRateHz) {
     return "the broadcast sample rate must lie in [1, " + std::to_string(int(kMaxSampleRateHz)) +
            "] Hz";
@@ -80,7 +85,9 @@ std::string DsssEncoderConfigError(const DsssEncoderConfig& config) {
     return "the carrier (" + std::to_string(int(config.waveform.carrier_frequency)) +
            " Hz) must lie below half the broadcast sample rate";
   }
-  if (!(config.transition_duration >= 0)) return "the transition must not be negative";
+  if (!(config.transition_duration >= 0 && config.transition_duration <= 1)) {
+    return "the transition must last 0 to 1 s";
+  }
   return std::string();
 }
 

@@ -93,6 +93,14 @@ TEST(AudioModemEncoderTest, ConfigErrorsAreSentencesNotAborts) {
             "the carrier (18500 Hz) must lie below half the broadcast sample rate");
   config.broadcast_sample_rate = 384001;
   EXPECT_EQ(DsssEncoderConfigError(config), "the broadcast sample rate must lie in [1, 384000] Hz");
+  // A transition of 2e8 s once overflowed its sample count.
+  config = DsssEncoderConfig();
+  config.transition_duration = 1;
+  EXPECT_EQ(DsssEncoderConfigError(config), "");
+  for (const float seconds : {1.0001f, 2e8f, std::numeric_limits<float>::infinity()}) {
+    config.transition_duration = seconds;
+    EXPECT_EQ(DsssEncoderConfigError(config), "the transition must last 0 to 1 s");
+  }
 }
 
 TEST(AudioModemEncoderTest, DtmfProductConfiguration) {

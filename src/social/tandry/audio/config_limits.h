@@ -18,6 +18,11 @@ constexpr int kMaxTokenBytes = 256;
 constexpr float kMaxSampleRateHz = 384000.0f;
 // Interleaved microphone channels.
 constexpr int kMaxChannels = 64;
+// Duration of one token on air, seconds, and of the history a decoder keeps
+// (its buffer length in tokens times that): they bound the memory that an
+// encoder and a decoder take (a minute of 384 kHz audio is 90 MiB of floats).
+constexpr double kMaxTokenSeconds = 30.0;
+constexpr double kMaxHistorySeconds = 60.0;
 // Coder samples per DSSS frame (code length x upsampling factor): 11 taps
 // at upsampling 32. Longer frames make tokens of minutes.
 constexpr int kMaxDsssFrameSamples = 65536;

@@ -47,6 +47,14 @@ std::string DsssWaveformConfigError(const DsssWaveformConfig& config) {
   return std::string();
 }
 
+double DsssTokenSeconds(const DsssWaveformConfig& config, int token_bytes, bool checksum_symbol) {
+  const double symbols = 1.0 + (8 / config.bits_per_symbol) * static_cast<double>(token_bytes) +
+                         (checksum_symbol ? 1 : 0);
+  const double frame =
+      static_cast<double>((1 << config.number_of_taps) - 1) * config.upsampling_factor;
+  return symbols * frame / config.sample_rate;
+}
+
 std::unique_ptr<audio_vesknet::SymbolWaveCoder> MakeSymbolWaveCoder(
     const DsssWaveformConfig& config) {
   audio_vesknet::SymbolWaveCoderParams params;

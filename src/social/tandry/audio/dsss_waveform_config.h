@@ -36,6 +36,12 @@ DsssWaveformConfig Waveform44100();
 // is wrong. Lets tools and hosts refuse a configuration instead of aborting.
 std::string DsssWaveformConfigError(const DsssWaveformConfig& config);
 
+// Seconds on air of a token of `token_bytes` bytes (check bytes included):
+// the sync symbol, (8 / bits_per_symbol) x token_bytes data symbols and the
+// checksum symbol when there is one, one frame each. For a configuration that
+// DsssWaveformConfigError accepts.
+double DsssTokenSeconds(const DsssWaveformConfig& config, int token_bytes, bool checksum_symbol);
+
 // The coder for `config` (aborts on a configuration that the error function
 // above refuses).
 std::unique_ptr<audio_vesknet::SymbolWaveCoder> MakeSymbolWaveCoder(

@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <limits>
 
+#include "audio/vesknet/dtmf/byte_symbol_converter.h"
 #include "social/tandry/audio/config_limits.h"
 
 namespace audio_modem {
@@ -79,7 +80,28 @@ std::string DtmfWaveformConfigError(const DtmfWaveformConfig& config) {
   if (total_time > config.window_duration * (1.0f + 4.0f * std::numeric_limits<float>::epsilon())) {
     return "the envelope times add up to more than the symbol duration";
   }
+  if (DtmfTokenSeconds(config) > kMaxTokenSeconds) {
+    return "a token may last at most " + std::to_string(static_cast<int>(kMaxTokenSeconds)) +
+           " s on air";
+  }
   return std::string();
+}
+
+double DtmfTokenSeconds(const DtmfWaveformConfig& config) {
+  audio_vesknet::DtmfEncoderParams params;
+  params.sample_rate = config.sample_rate;
+  params.baseband_decimation_factor = config.baseband_decimation_factor;
+  params.window_duration = config.window_duration;
+  const int64_t num_tones = config.tone_frequencies.empty()
+                                ? static_cast<int64_t>(params.tone_frequencies.size())
+                                : static_cast<int64_t>(config.tone_frequencies.size());
+  const int64_t alphabet =
+      CountCombinationsUpTo(num_tones, config.tones_per_symbol, kMaxAlphabetSize);
+  const audio_vesknet::ByteSymbolConverter converter(
+      static_cast<int>(alphabet), static_cast<int>(alphabet - 1), config.bytes_in_token);
+  const double symbols =
+      converter.symbols_in_token() + 1.0 + (config.append_checksum_symbol ? 1.0 : 0.0);
+  return symbols * audio_vesknet::GetFrameSize(params) / config.sample_rate;
 }
 
 bool MakeDtmfEncoderParams(const DtmfWaveformConfig& config,

@@ -45,6 +45,11 @@ struct DtmfWaveformConfig {
 // tools refuse a configuration instead of aborting.
 std::string DtmfWaveformConfigError(const DtmfWaveformConfig& config);
 
+// Seconds on air of one token: its symbols, the spacer and the checksum
+// symbol when there is one, one frame each. For a configuration that
+// DtmfWaveformConfigError accepts.
+double DtmfTokenSeconds(const DtmfWaveformConfig& config);
+
 // Fills *params: the record's defaults, the fields of `config`, its tone set
 // (when given) with the last combination as the spacer, and its envelope.
 // Returns false, having logged why, when the envelope is refused (see

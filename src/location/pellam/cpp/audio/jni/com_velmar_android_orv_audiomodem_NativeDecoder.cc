@@ -143,8 +143,18 @@ Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeProcessSamplesWithZin
   const int16_t* pcm = SamplesOf(env, buffer, offset, length, &count);
   AudioModemDecoder* decoder = FindDecoder(id, "nativeProcessSamplesWithZintar()");
   if (decoder == nullptr) return;
-  // The listening mode mixes stereo down in place, in the host's buffer.
-  decoder->ProcessSamplesWithZintar(const_cast<int16_t*>(pcm), count);
+  int16_t* samples = const_cast<int16_t*>(pcm);
+  if (reinterpret_cast<uintptr_t>(samples) % alignof(int16_t) == 0) {
+    // The listening mode mixes stereo down in place, in the host's buffer.
+    decoder->ProcessSamplesWithZintar(samples, count);
+    return;
+  }
+  // A buffer at an odd address cannot be read as 16-bit values: work on an
+  // aligned copy, then hand the host its buffer mixed down as usual.
+  std::vector<int16_t> aligned(count);
+  std::memcpy(aligned.data(), samples, aligned.size() * sizeof(int16_t));
+  decoder->ProcessSamplesWithZintar(aligned.data(), count);
+  std::memcpy(samples, aligned.data(), aligned.size() * sizeof(int16_t));
 }
 
 JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeGetTokens(

@@ -1,0 +1,120 @@
+// Fuzz target: the C interface. Any configuration and options (read around
+// the edges that validation knows); what is accepted must encode the message
+// and decode hostile PCM cut into chunks of any size (frames split between
+// calls), with token, broadcaster, flush and wipe calls between. A status
+// other than VESK_OK after acceptance, a fatal check, a crash or a sanitizer
+// report is a finding.
+
+#include <cstdint>
+#include <vector>
+
+#include "base/fuzz_input.h"
+#include "social/tandry/audio/fuzz_modem_config.h"
+#include "vesk/vesk.h"
+
+namespace {
+
+void ToC(const audio_modem::FuzzModemConfig& f, vesk_config* config,
+         vesk_decoder_options* options) {
+  vesk_config_defaults(config, f.dtmf ? VESK_MODEM_DTMF : VESK_MODEM_DSSS);
+  config->message_bytes = f.message_bytes;
+  config->crc_check_bytes = f.crc_check_bytes;
+  config->checksum_symbol = f.checksum_symbol;
+  vesk_dsss_waveform& w = config->dsss;
+  w.number_of_taps = f.dsss.number_of_taps;
+  w.code_number = f.dsss.code_number;
+  w.coder_sample_rate_hz = f.dsss.sample_rate;
+  w.upsampling_factor = f.dsss.upsampling_factor;
+  w.baseband_decimation_factor = f.dsss.baseband_decimation_factor;
+  w.carrier_frequency_hz = f.dsss.carrier_frequency;
+  w.bits_per_symbol = f.dsss.bits_per_symbol;
+  w.min_cycles_per_frame = f.dsss.min_cycles_per_frame;
+  w.quadrature_carrier = f.dsss.use_quadrature_carrier;
+  w.single_sideband = f.single_sideband;
+  w.broadcast_sample_rate_hz = f.broadcast_sample_rate;
+  w.transition_seconds = f.transition_seconds;
+  vesk_dtmf_waveform& t = config->dtmf;
+  t.sample_rate_hz = f.dtmf_waveform.sample_rate;
+  t.baseband_decimation_factor = f.dtmf_waveform.baseband_decimation_factor;
+  t.window_seconds = f.dtmf_waveform.window_duration;
+  t.tones_per_symbol = f.dtmf_waveform.tones_per_symbol;
+  t.attack_seconds = f.dtmf_waveform.attack_time;
+  t.decay_seconds = f.dtmf_waveform.decay_time;
+  t.sustain_seconds = f.dtmf_waveform.sustain_time;
+  t.release_seconds = f.dtmf_waveform.release_time;
+  t.sustain_level = f.dtmf_waveform.sustain_amplitude;
+  t.tone_frequencies_hz = f.dtmf_waveform.tone_frequencies.data();
+  t.num_tones = static_cast<int>(f.dtmf_waveform.tone_frequencies.size());
+  vesk_decoder_options_defaults(options);
+  options->microphone_rate_hz = static_cast<int>(f.microphone_rate);
+  options->channels = f.channels;
+  options->listening_mode = f.listening_mode;
+  options->max_tokens_per_call = f.max_tokens_per_call;
+  options->buffer_length_tokens = f.buffer_length_tokens;
+  options->acquisition_window_seconds = f.acquisition_window_seconds;
+  options->broadcaster_threshold = f.broadcaster_threshold;
+  options->design_baseband_filter = f.design_baseband_filter;
+}
+
+void Require(bool condition) {
+  if (!condition) __builtin_trap();
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+  base::SilenceLogsForFuzzing();
+  base::FuzzInput input(data, size);
+  const audio_modem::FuzzModemConfig fuzz_config = audio_modem::ReadFuzzModemConfig(&input);
+  // Microphone rates beyond int are out of reach of the C records.
+  if (!(fuzz_config.microphone_rate > -2e9f && fuzz_config.microphone_rate < 2e9f)) return 0;
+  vesk_config config;
+  vesk_decoder_options options;
+  ToC(fuzz_config, &config, &options);
+  options.poll_interval_seconds = input.Byte() / 128.0;
+  options.hold_seconds = input.Byte() / 16.0;
+
+  vesk_encoder* encoder = nullptr;
+  if (vesk_encoder_create(&config, &encoder) == VESK_OK) {
+    std::vector<uint8_t> message(config.message_bytes);
+    for (uint8_t& byte : message) byte = input.Byte();
+    vesk_pcm pcm;
+    Require(vesk_encoder_encode(encoder, message.data(), message.size(), &pcm) == VESK_OK);
+    Require(pcm.num_samples == pcm.transition_samples + pcm.token_samples);
+    vesk_pcm_free(&pcm);
+    vesk_encoder_destroy(encoder);
+  }
+
+  vesk_decoder* decoder = nullptr;
+  if (vesk_decoder_create(&config, &options, &decoder) != VESK_OK) return 0;
+  audio_modem::FuzzDecoderCalls calls;
+  calls.process = [&](const audio_modem::FuzzProcessCall& call) {
+    // Two chunks, cut anywhere (frames split between calls).
+    const int16_t* samples = call.samples.data();
+    Require(vesk_decoder_process(decoder, samples, call.cut) == VESK_OK);
+    Require(vesk_decoder_process(decoder, samples + call.cut, call.samples.size() - call.cut) ==
+            VESK_OK);
+  };
+  calls.tokens = [&] {
+    const vesk_token* tokens = nullptr;
+    size_t count = 0;
+    Require(vesk_decoder_take_tokens(decoder, &tokens, &count) == VESK_OK);
+    for (size_t i = 0; i < count; ++i) {
+      Require(tokens[i].message_bytes == static_cast<size_t>(config.message_bytes));
+    }
+  };
+  calls.broadcaster = [&] {
+    int heard = 0;
+    Require(vesk_decoder_broadcaster(decoder, &heard) == VESK_OK);
+  };
+  calls.wipe = [&](uint8_t variant) {
+    if (variant & 1) {
+      Require(vesk_decoder_flush(decoder) == VESK_OK);
+    } else {
+      Require(vesk_decoder_wipe(decoder) == VESK_OK);
+    }
+  };
+  audio_modem::RunFuzzDecoderCalls(&input, options.channels, calls);
+  vesk_decoder_destroy(decoder);
+  return 0;
+}
