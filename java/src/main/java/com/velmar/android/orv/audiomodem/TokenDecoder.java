@@ -23,7 +23,8 @@ import java.util.function.Supplier;
  * <p>The decoder keeps a history of a few token durations ({@link
  * DecoderOptions#bufferLengthTokens()}); call {@link #tokens()} at least once per such span (every
  * quarter second is typical) so that nothing heard is lost. A token heard several times is
- * reported each time it is asked for while it is in the history.
+ * reported each time it is asked for while it is in the history. A recording loop is simpler
+ * with a {@link TokenStream}, which polls for it and reports each token once per sighting.
  *
  * <p>Thread-safe: each decoder serialises its own calls, and creating or closing decoders is
  * serialised against all other calls, as the native table requires. Several decoders may be used
@@ -39,14 +40,17 @@ public final class TokenDecoder implements AutoCloseable {
 
   private final NativeDecoder peer = new NativeDecoder();
   private final int id;
+  private final String modem;
   private final int messageBytes;
   private final int crcCheckBytes;
   private final DecoderOptions options;
   private ByteBuffer chunk;
   private boolean closed;
 
-  private TokenDecoder(int id, int messageBytes, int crcCheckBytes, DecoderOptions options) {
+  private TokenDecoder(
+      int id, String modem, int messageBytes, int crcCheckBytes, DecoderOptions options) {
     this.id = id;
+    this.modem = modem;
     this.messageBytes = messageBytes;
     this.crcCheckBytes = crcCheckBytes;
     this.options = options;
@@ -57,7 +61,7 @@ public final class TokenDecoder implements AutoCloseable {
     return changingTable(() -> {
       int id = USED_IDS.nextClearBit(0);
       TokenDecoder decoder =
-          new TokenDecoder(id, config.messageBytes(), config.crcCheckBytes(), options);
+          new TokenDecoder(id, Token.DSSS, config.messageBytes(), config.crcCheckBytes(), options);
       decoder.peer.nativeInitializeDsss(id, config.tokenLengthBytes(), config.checksumSymbol(),
           options.designBasebandFilter(), config.numberOfTaps(), config.codeNumber(),
           config.coderSampleRate(), config.upsamplingFactor(), config.carrierFrequency(),
@@ -84,7 +88,7 @@ public final class TokenDecoder implements AutoCloseable {
     return changingTable(() -> {
       int id = USED_IDS.nextClearBit(0);
       TokenDecoder decoder =
-          new TokenDecoder(id, config.messageBytes(), config.crcCheckBytes(), options);
+          new TokenDecoder(id, Token.DTMF, config.messageBytes(), config.crcCheckBytes(), options);
       DtmfConfig.Envelope envelope = config.envelope();
       boolean built = decoder.peer.nativeInitializeDtmf(id, config.tokenLengthBytes(),
           config.checksumSymbol(), config.sampleRate(), config.basebandDecimationFactor(),
@@ -98,6 +102,16 @@ public final class TokenDecoder implements AutoCloseable {
       USED_IDS.set(id);
       return decoder;
     });
+  }
+
+  /** The modem this decoder hears: {@link Token#DSSS} ("dsss") or {@link Token#DTMF} ("dtmf"). */
+  public String modem() {
+    return modem;
+  }
+
+  /** The options it was created with: the microphone's rate and channels among them. */
+  public DecoderOptions options() {
+    return options;
   }
 
   /** Feeds interleaved 16-bit samples (all of {@code samples}). */
