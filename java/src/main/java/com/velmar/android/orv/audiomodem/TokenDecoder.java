@@ -191,9 +191,9 @@ public final class TokenDecoder implements AutoCloseable {
    * @throws IllegalStateException if the decoder is closed
    */
   public List<byte[]> tokens() {
-    List<byte[]> tokens = new ArrayList<>();
-    run(() -> peer.nativeGetTokens(id, (TokenReceiver) tokens::add, messageBytes, crcCheckBytes));
-    return tokens;
+    Collector collector = new Collector();
+    run(() -> peer.nativeGetTokens(id, collector, messageBytes, crcCheckBytes));
+    return collector.tokens;
   }
 
   /**
@@ -269,5 +269,16 @@ public final class TokenDecoder implements AutoCloseable {
       use.run();
       return null;
     });
+  }
+
+  // The receiver of nativeGetTokens: a named class rather than a lambda, so that the shrink test
+  // sees the callback as an app's shrinker (which turns lambdas into such classes) does.
+  private static final class Collector implements TokenReceiver {
+    final List<byte[]> tokens = new ArrayList<>();
+
+    @Override
+    public void addToken(byte[] token) {
+      tokens.add(token);
+    }
   }
 }
