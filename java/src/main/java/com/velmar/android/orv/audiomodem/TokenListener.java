@@ -13,8 +13,8 @@ public interface TokenListener {
 
   /**
    * A DSSS transmitter became audible ({@code heard} true) or fell silent (false); called only on
-   * changes, starting from not heard. A broadcaster is usually heard a few tenths of a second
-   * before its first token decodes. DTMF streams never call it.
+   * changes, starting from not heard. A broadcaster is usually heard before its first token
+   * decodes. DTMF streams never call it.
    */
   default void onBroadcaster(boolean heard) {}
 }
