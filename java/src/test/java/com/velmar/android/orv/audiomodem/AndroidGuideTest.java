@@ -21,22 +21,29 @@ import org.junit.jupiter.api.Test;
 import org.junit.jupiter.api.io.TempDir;
 
 /**
- * The Java blocks of the Android integration guide compile, as Java 8, against this library and
- * stand-ins for the Android classes they use: every Vesk call in them exists with that signature.
- * The build passes the guide's path and the class path.
+ * The Android integration guide stays true to the code: its Java blocks compile, as Java 8, against
+ * this library and stand-ins for the Android classes they use (so every Vesk call in them exists
+ * with that signature), and the files its Gradle module names exist. The build passes the guide's
+ * path and the class path.
  */
 class AndroidGuideTest {
   private static final Pattern JAVA_BLOCK = Pattern.compile("(?s)```java\n(.*?)```");
   private static final Pattern PUBLIC_TYPE =
       Pattern.compile("(?m)^public (?:final |abstract )*(?:class|interface|enum) (\\w+)");
+  // Paths into this repository, checked out as "vesk" beside the app's module.
+  private static final Pattern REPOSITORY_PATH = Pattern.compile("'\\.\\./vesk/([^']+)'");
+
+  private static Path guide() {
+    String path = System.getProperty("vesk.android.guide");
+    assertNotNull(path, "-Dvesk.android.guide names the guide");
+    return Paths.get(path);
+  }
 
   @Test
   void javaBlocksCompile(@TempDir Path dir) throws IOException {
-    String guidePath = System.getProperty("vesk.android.guide");
     String classPath = System.getProperty("vesk.android.classpath");
-    assertNotNull(guidePath, "-Dvesk.android.guide names the guide");
     assertNotNull(classPath, "-Dvesk.android.classpath names the library and the stand-ins");
-    String guide = new String(Files.readAllBytes(Paths.get(guidePath)), StandardCharsets.UTF_8);
+    String guide = new String(Files.readAllBytes(guide()), StandardCharsets.UTF_8);
 
     List<String> sources = new ArrayList<>();
     Matcher block = JAVA_BLOCK.matcher(guide);
@@ -54,8 +61,23 @@ class AndroidGuideTest {
         "-Werror", "-proc:none", "-classpath", classPath, "-d", dir.toString()));
     arguments.addAll(sources);
     JavaCompiler javac = ToolProvider.getSystemJavaCompiler();
+    assertNotNull(javac, "the tests run on a JDK, which has a compiler");
     ByteArrayOutputStream diagnostics = new ByteArrayOutputStream();
     int status = javac.run(null, null, diagnostics, arguments.toArray(new String[0]));
     assertEquals(0, status, diagnostics.toString("UTF-8"));
+  }
+
+  @Test
+  void theModuleNamesFilesThatExist() throws IOException {
+    Path repository = guide().toAbsolutePath().getParent().getParent();
+    String guide = new String(Files.readAllBytes(guide()), StandardCharsets.UTF_8);
+    Matcher path = REPOSITORY_PATH.matcher(guide);
+    int paths = 0;
+    while (path.find()) {
+      assertTrue(Files.exists(repository.resolve(path.group(1))), path.group());
+      paths++;
+    }
+    // The consumer rules, the CMake project and the Java sources.
+    assertEquals(3, paths);
   }
 }

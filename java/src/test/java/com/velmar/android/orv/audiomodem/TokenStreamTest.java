@@ -55,13 +55,14 @@ class TokenStreamTest {
     }
   }
 
-  /** Three repetitions of the DSSS product token, after its start transition. */
+  /** {@code message} encoded with the DSSS product configuration. */
   static EncodedToken dsssToken(byte[] message) {
     try (TokenEncoder encoder = TokenEncoder.create(DSSS)) {
       return encoder.encode(message);
     }
   }
 
+  /** The start transition, then the token three times. */
   static short[] threeTimes(EncodedToken token) {
     return EncodedToken.toSamples(token.playback(3));
   }
