@@ -21,7 +21,7 @@ packages_of() {
   case $1 in
     build) echo build-essential cmake pkg-config libkissfft-dev android-liblog-dev libsndfile1-dev ;;
     test) echo googletest libgtest-dev libgmock-dev libbenchmark-dev clang-format ;;
-    java) echo openjdk-17-jdk-headless junit5 ;;
+    java) echo openjdk-17-jdk-headless junit5 proguard-cli ;;
     i686) echo g++-multilib libkissfft-dev:i386 android-liblog-dev:i386 libgtest-dev:i386 \
       libgmock-dev:i386 libbenchmark-dev:i386 ;;
     fuzz) echo clang libclang-rt-14-dev ;;

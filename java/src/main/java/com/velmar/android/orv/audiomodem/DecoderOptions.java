@@ -1,5 +1,7 @@
 package com.velmar.android.orv.audiomodem;
 
+import static com.velmar.android.orv.audiomodem.Checks.require;
+
 /**
  * How a receiver listens: the microphone format and the decoder's tuning. Immutable.
  *
@@ -29,38 +31,47 @@ public final class DecoderOptions {
     listeningMode = b.listeningMode;
   }
 
+  /** The measured defaults, for a 44100 Hz mono microphone. */
   public static DecoderOptions defaults() {
     return builder().build();
   }
 
+  /** A builder holding the defaults. */
   public static Builder builder() {
     return new Builder();
   }
 
+  /** Sample rate of the microphone input, Hz, at least 1000. */
   public int microphoneRate() {
     return microphoneRate;
   }
 
+  /** Interleaved channels of the microphone input, at least 1. */
   public int channels() {
     return channels;
   }
 
+  /** Span of acquisition scores that broadcaster detection integrates, seconds, positive. DSSS. */
   public float acquisitionWindowSeconds() {
     return acquisitionWindowSeconds;
   }
 
+  /** Integrated acquisition score above which a broadcaster counts as heard. DSSS. */
   public float broadcasterThreshold() {
     return broadcasterThreshold;
   }
 
+  /** Input history that the decoder keeps, in token durations, at least 1. */
   public float bufferLengthTokens() {
     return bufferLengthTokens;
   }
 
+  /** Most tokens that one {@link TokenDecoder#tokens()} call returns, 1 to 6. */
   public int maxTokensPerCall() {
     return maxTokensPerCall;
   }
 
+  /** Whether the DSSS decoder designs its baseband low-pass instead of using fixed taps. */
   public boolean designBasebandFilter() {
     return designBasebandFilter;
   }
@@ -85,40 +96,52 @@ public final class DecoderOptions {
 
     private Builder() {}
 
-    /** Microphone sample rate, Hz. */
+    /** Microphone sample rate, Hz, at least 1000 (default 44100). */
     public Builder microphoneRate(int hertz) {
       microphoneRate = hertz;
       return this;
     }
 
-    /** Interleaved microphone channels (stereo input is summed). */
+    /** Interleaved microphone channels, at least 1; mixed to mono (default 1). */
     public Builder channels(int count) {
       channels = count;
       return this;
     }
 
+    /**
+     * Span of acquisition scores that {@link TokenDecoder#broadcasterDetected()} integrates,
+     * seconds, positive (default 0.75). DSSS only.
+     */
     public Builder acquisitionWindowSeconds(float seconds) {
       acquisitionWindowSeconds = seconds;
       return this;
     }
 
+    /**
+     * Integrated score above which a broadcaster counts as heard (default 5: noise peaks near 3.5,
+     * a token at -20 dB scores 8 to 9). DSSS only.
+     */
     public Builder broadcasterThreshold(float threshold) {
       broadcasterThreshold = threshold;
       return this;
     }
 
-    /** History kept, in token durations. */
+    /** History kept, in token durations, at least 1 (default 4; 2 loses about 1 dB). */
     public Builder bufferLengthTokens(float tokens) {
       bufferLengthTokens = tokens;
       return this;
     }
 
-    /** 1 to 6. */
+    /** Most tokens that one {@link TokenDecoder#tokens()} call returns, 1 to 6 (default 2). */
     public Builder maxTokensPerCall(int count) {
       maxTokensPerCall = count;
       return this;
     }
 
+    /**
+     * Whether the DSSS decoder designs its baseband low-pass (true) or uses the fixed taps 0.25,
+     * 0.5, 0.25 (false, the default); both measure the same. DSSS only.
+     */
     public Builder designBasebandFilter(boolean enabled) {
       designBasebandFilter = enabled;
       return this;
@@ -135,22 +158,20 @@ public final class DecoderOptions {
       return this;
     }
 
+    /**
+     * The options.
+     *
+     * @throws IllegalArgumentException naming the first value outside its range
+     */
     public DecoderOptions build() {
       require(microphoneRate >= 1000, "microphoneRate must be at least 1000 Hz");
       require(channels >= 1, "channels must be at least 1");
       require(acquisitionWindowSeconds > 0, "acquisitionWindowSeconds must be positive");
       require(bufferLengthTokens >= 1, "bufferLengthTokens must be at least 1");
       require(maxTokensPerCall >= 1 && maxTokensPerCall <= 6, "maxTokensPerCall must be 1 to 6");
-      require(
-          !listeningMode || microphoneRate >= MIN_LISTENING_RATE,
+      require(!listeningMode || microphoneRate >= MIN_LISTENING_RATE,
           "the listening mode needs a microphone rate of at least " + MIN_LISTENING_RATE + " Hz");
       return new DecoderOptions(this);
-    }
-
-    private static void require(boolean condition, String message) {
-      if (!condition) {
-        throw new IllegalArgumentException(message);
-      }
     }
   }
 }

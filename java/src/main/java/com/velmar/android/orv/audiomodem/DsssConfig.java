@@ -1,5 +1,7 @@
 package com.velmar.android.orv.audiomodem;
 
+import static com.velmar.android.orv.audiomodem.Checks.require;
+
 /**
  * What a DSSS transmitter and its receivers must agree on: the token layout and the waveform.
  *
@@ -53,10 +55,12 @@ public final class DsssConfig {
     return builder().build();
   }
 
+  /** A builder holding the product defaults. */
   public static Builder builder() {
     return new Builder();
   }
 
+  /** A builder holding this configuration's values, to derive a variant from it. */
   public Builder toBuilder() {
     Builder b = new Builder();
     b.messageBytes = messageBytes;
@@ -77,7 +81,7 @@ public final class DsssConfig {
     return b;
   }
 
-  /** Message bytes per token, without check bytes. */
+  /** Message bytes per token, without check bytes: at least 1. */
   public int messageBytes() {
     return messageBytes;
   }
@@ -92,54 +96,70 @@ public final class DsssConfig {
     return messageBytes + crcCheckBytes;
   }
 
+  /** Whether a checksum symbol follows the data symbols of each token. */
   public boolean checksumSymbol() {
     return checksumSymbol;
   }
 
+  /** Whether the encoder removes everything below the carrier (receivers have no such setting). */
   public boolean singleSideband() {
     return singleSideband;
   }
 
+  /** Register length of the pseudo-noise code, 5 to 11: the code has 2^taps - 1 chips. */
   public int numberOfTaps() {
     return numberOfTaps;
   }
 
+  /** Which code of that register length: 0 to 2 for 5 or 6 taps, 0 to 3 otherwise. */
   public int codeNumber() {
     return codeNumber;
   }
 
+  /** Sample rate at which the symbols are synthesised, Hz, positive. */
   public float coderSampleRate() {
     return coderSampleRate;
   }
 
+  /** Coder samples per chip, positive and a multiple of {@link #basebandDecimationFactor()}. */
   public int upsamplingFactor() {
     return upsamplingFactor;
   }
 
+  /**
+   * Requested carrier, Hz, in (0, coder sample rate / 2]; the coder snaps it to a whole number of
+   * cycles per frame.
+   */
   public float carrierFrequency() {
     return carrierFrequency;
   }
 
+  /** Data bits per symbol: 1, 2, 4 or 8. */
   public int bitsPerSymbol() {
     return bitsPerSymbol;
   }
 
+  /** Cycles per frame of the tone that marks symbol 0 (symbol s has this + s), at least 0. */
   public int minCyclesPerFrame() {
     return minCyclesPerFrame;
   }
 
+  /** Coder rate over the receiver's baseband rate, positive; divides the upsampling factor. */
   public int basebandDecimationFactor() {
     return basebandDecimationFactor;
   }
 
+  /** Whether the symbol tone rides on the cosine carrier rather than the sine. */
   public boolean quadratureCarrier() {
     return quadratureCarrier;
   }
 
+  /** Sample rate of the encoded audio handed to the loudspeaker, Hz, positive. */
   public int broadcastSampleRate() {
     return broadcastSampleRate;
   }
 
+  /** Length of the fade-in played before the first repetition, seconds, at least 0. */
   public float transitionSeconds() {
     return transitionSeconds;
   }
@@ -179,6 +199,7 @@ public final class DsssConfig {
 
     private Builder() {}
 
+    /** Message bytes per token, without check bytes: at least 1 (default 6). */
     public Builder messageBytes(int value) {
       messageBytes = value;
       return this;
@@ -190,24 +211,32 @@ public final class DsssConfig {
       return this;
     }
 
+    /** Whether a checksum symbol follows the data symbols (default off; CRC-16 is on). */
     public Builder checksumSymbol(boolean enabled) {
       checksumSymbol = enabled;
       return this;
     }
 
+    /** Whether the encoder removes everything below the carrier (default off). */
     public Builder singleSideband(boolean enabled) {
       singleSideband = enabled;
       return this;
     }
 
-    /** The PN code: register length 5 to 11 and code number 0 to 2 (5, 6 taps) or 3. */
+    /**
+     * The pseudo-noise code: register length 5 to 11 and code number 0 to 2 (5 or 6 taps) or 0 to
+     * 3 (default 7 taps, code 0: 127 chips).
+     */
     public Builder code(int numberOfTaps, int codeNumber) {
       this.numberOfTaps = numberOfTaps;
       this.codeNumber = codeNumber;
       return this;
     }
 
-    /** The coder: sample rate (Hz), samples per chip and baseband decimation. */
+    /**
+     * The coder: its sample rate (Hz, positive), samples per chip (positive) and baseband
+     * decimation (positive, dividing the samples per chip). Default 48000 Hz, 16, 4.
+     */
     public Builder coder(float sampleRate, int upsamplingFactor, int basebandDecimationFactor) {
       coderSampleRate = sampleRate;
       this.upsamplingFactor = upsamplingFactor;
@@ -220,65 +249,65 @@ public final class DsssConfig {
       return coder(44100f, 15, 3);
     }
 
+    /** Requested carrier, Hz, in (0, coder sample rate / 2] (default 18500). */
     public Builder carrierFrequency(float hertz) {
       carrierFrequency = hertz;
       return this;
     }
 
-    /** 1, 2, 4 or 8. */
+    /** Data bits per symbol: 1, 2, 4 or 8 (default 4). */
     public Builder bitsPerSymbol(int value) {
       bitsPerSymbol = value;
       return this;
     }
 
+    /** Cycles per frame of the tone that marks symbol 0, at least 0 (default 4). */
     public Builder minCyclesPerFrame(int value) {
       minCyclesPerFrame = value;
       return this;
     }
 
+    /** Whether the symbol tone rides on the cosine carrier (default off). */
     public Builder quadratureCarrier(boolean enabled) {
       quadratureCarrier = enabled;
       return this;
     }
 
+    /** Sample rate of the encoded audio, Hz, positive (default 48000). */
     public Builder broadcastSampleRate(int hertz) {
       broadcastSampleRate = hertz;
       return this;
     }
 
+    /** Length of the fade-in before the first repetition, seconds, at least 0 (default 0.005). */
     public Builder transitionSeconds(float seconds) {
       transitionSeconds = seconds;
       return this;
     }
 
+    /**
+     * The configuration.
+     *
+     * @throws IllegalArgumentException naming the first value outside its range
+     */
     public DsssConfig build() {
       require(messageBytes >= 1, "messageBytes must be at least 1");
       require(numberOfTaps >= 5 && numberOfTaps <= 11, "numberOfTaps must be 5 to 11");
-      require(
-          codeNumber >= 0 && codeNumber <= (numberOfTaps <= 6 ? 2 : 3),
+      require(codeNumber >= 0 && codeNumber <= (numberOfTaps <= 6 ? 2 : 3),
           "codeNumber must be 0 to 2 for 5 or 6 taps, 0 to 3 otherwise");
       require(coderSampleRate > 0, "coder sample rate must be positive");
       require(upsamplingFactor > 0, "upsamplingFactor must be positive");
       require(basebandDecimationFactor > 0, "basebandDecimationFactor must be positive");
-      require(
-          upsamplingFactor % basebandDecimationFactor == 0,
+      require(upsamplingFactor % basebandDecimationFactor == 0,
           "upsamplingFactor must be a multiple of basebandDecimationFactor");
-      require(
-          carrierFrequency > 0 && carrierFrequency <= coderSampleRate / 2,
+      require(carrierFrequency > 0 && carrierFrequency <= coderSampleRate / 2,
           "carrierFrequency must lie in (0, coder sample rate / 2]");
-      require(
-          bitsPerSymbol == 1 || bitsPerSymbol == 2 || bitsPerSymbol == 4 || bitsPerSymbol == 8,
+      require(bitsPerSymbol == 1 || bitsPerSymbol == 2 || bitsPerSymbol == 4 || bitsPerSymbol == 8,
           "bitsPerSymbol must be 1, 2, 4 or 8");
       require(minCyclesPerFrame >= 0, "minCyclesPerFrame must not be negative");
       require(broadcastSampleRate > 0, "broadcastSampleRate must be positive");
       require(transitionSeconds >= 0, "transitionSeconds must not be negative");
       return new DsssConfig(this);
-    }
-
-    private static void require(boolean condition, String message) {
-      if (!condition) {
-        throw new IllegalArgumentException(message);
-      }
     }
   }
 }

@@ -1,5 +1,7 @@
 package com.velmar.android.orv.audiomodem;
 
+import static com.velmar.android.orv.audiomodem.Checks.require;
+
 import java.util.Arrays;
 
 /**
@@ -26,7 +28,7 @@ public final class DtmfConfig {
   private final int basebandDecimationFactor;
   private final float windowSeconds;
   private final int tonesPerSymbol;
-  private final float[] envelope; // attack, decay, sustain, release (s), sustain level
+  private final Envelope envelope;
   private final float[] toneFrequencies; // Empty: the default set.
 
   private DtmfConfig(Builder b) {
@@ -37,22 +39,26 @@ public final class DtmfConfig {
     basebandDecimationFactor = b.basebandDecimationFactor;
     windowSeconds = b.windowSeconds;
     tonesPerSymbol = b.tonesPerSymbol;
-    envelope = b.envelope.clone();
+    envelope = b.envelope;
     toneFrequencies = b.toneFrequencies.clone();
   }
 
+  /** The product configuration. */
   public static DtmfConfig defaults() {
     return builder().build();
   }
 
+  /** A builder holding the product defaults. */
   public static Builder builder() {
     return new Builder();
   }
 
+  /** Message bytes per token, without check bytes: at least 1. */
   public int messageBytes() {
     return messageBytes;
   }
 
+  /** CRC-16 check bytes per token: 0 or 2. */
   public int crcCheckBytes() {
     return crcCheckBytes;
   }
@@ -62,32 +68,37 @@ public final class DtmfConfig {
     return messageBytes + crcCheckBytes;
   }
 
+  /** Whether a checksum symbol follows the message symbols of each token. */
   public boolean checksumSymbol() {
     return checksumSymbol;
   }
 
+  /** Sample rate of the modulation and of the encoded audio, Hz, positive. */
   public float sampleRate() {
     return sampleRate;
   }
 
+  /** Modulation rate over the receiver's tone-analysis rate, at least 1. */
   public int basebandDecimationFactor() {
     return basebandDecimationFactor;
   }
 
+  /** Nominal symbol length, seconds, positive; see {@link #frameSize()} for the exact one. */
   public float windowSeconds() {
     return windowSeconds;
   }
 
+  /** Tones that sound together in each symbol, at least 1. */
   public int tonesPerSymbol() {
     return tonesPerSymbol;
   }
 
-  /** Attack, decay, sustain and release times (s) and the sustain level. */
-  public float[] envelope() {
-    return envelope.clone();
+  /** The envelope that shapes every symbol. */
+  public Envelope envelope() {
+    return envelope;
   }
 
-  /** The tone set, Hz; empty for the default set. */
+  /** The tone set, Hz, each in [0, sample rate / 2); empty for the default set. */
   public float[] toneFrequencies() {
     return toneFrequencies.clone();
   }
@@ -98,6 +109,55 @@ public final class DtmfConfig {
         * basebandDecimationFactor;
   }
 
+  /**
+   * The envelope of one symbol: a smooth rise over the attack to full amplitude, a smooth fall over
+   * the decay to the sustain level, a hold for the sustain time, a smooth fall over the release to
+   * silence, then silence to the end of the symbol. The four times add up to at most the window.
+   * Immutable.
+   */
+  public static final class Envelope {
+    private final float attackSeconds;
+    private final float decaySeconds;
+    private final float sustainSeconds;
+    private final float releaseSeconds;
+    private final float sustainLevel;
+
+    private Envelope(float attackSeconds, float decaySeconds, float sustainSeconds,
+        float releaseSeconds, float sustainLevel) {
+      this.attackSeconds = attackSeconds;
+      this.decaySeconds = decaySeconds;
+      this.sustainSeconds = sustainSeconds;
+      this.releaseSeconds = releaseSeconds;
+      this.sustainLevel = sustainLevel;
+    }
+
+    /** Rise to full amplitude, seconds, finite and at least 0. */
+    public float attackSeconds() {
+      return attackSeconds;
+    }
+
+    /** Fall from full amplitude to the sustain level, seconds, finite and at least 0. */
+    public float decaySeconds() {
+      return decaySeconds;
+    }
+
+    /** Hold at the sustain level, seconds, finite and at least 0. */
+    public float sustainSeconds() {
+      return sustainSeconds;
+    }
+
+    /** Fall from the sustain level to silence, seconds, finite and at least 0. */
+    public float releaseSeconds() {
+      return releaseSeconds;
+    }
+
+    /** Amplitude held during the sustain, relative to full amplitude, in [0, 1]. */
+    public float sustainLevel() {
+      return sustainLevel;
+    }
+  }
+
+  /** Builder with the product defaults. */
   public static final class Builder {
     private int messageBytes = 5;
     private int crcCheckBytes = 0;
@@ -106,11 +166,12 @@ public final class DtmfConfig {
     private int basebandDecimationFactor = 16;
     private float windowSeconds = 0.05f;
     private int tonesPerSymbol = 2;
-    private float[] envelope = {0.025f, 0f, 0f, 0.025f, 1f};
+    private Envelope envelope = new Envelope(0.025f, 0f, 0f, 0.025f, 1f);
     private float[] toneFrequencies = new float[0];
 
     private Builder() {}
 
+    /** Message bytes per token, without check bytes: at least 1 (default 5). */
     public Builder messageBytes(int value) {
       messageBytes = value;
       return this;
@@ -122,53 +183,71 @@ public final class DtmfConfig {
       return this;
     }
 
+    /** Whether a checksum symbol follows the message symbols (default on). */
     public Builder checksumSymbol(boolean enabled) {
       checksumSymbol = enabled;
       return this;
     }
 
-    /** Sample rate of the audio, Hz. */
+    /** Sample rate of the modulation and of the encoded audio, Hz, positive (default 44100). */
     public Builder sampleRate(float hertz) {
       sampleRate = hertz;
       return this;
     }
 
+    /**
+     * Modulation rate over the receiver's tone-analysis rate, at least 1 (default 16); a symbol is
+     * a whole number of such steps.
+     */
     public Builder basebandDecimationFactor(int factor) {
       basebandDecimationFactor = factor;
       return this;
     }
 
-    /** Nominal symbol duration, seconds. */
+    /**
+     * Nominal symbol duration, seconds, positive and at least one decimated sample (default 0.05).
+     */
     public Builder windowSeconds(float seconds) {
       windowSeconds = seconds;
       return this;
     }
 
-    /** The tone set (Hz) and how many tones sound together; every combination is a symbol. */
+    /**
+     * The tone set (Hz, each in [0, sample rate / 2)) and how many tones sound together (at least
+     * 1); every combination is a symbol, and there must be at least 3 symbols and no more than
+     * pairs of tones. Default: 10 tones from 740 Hz, 2 per symbol.
+     */
     public Builder tones(float[] frequencies, int perSymbol) {
       toneFrequencies = frequencies.clone();
       tonesPerSymbol = perSymbol;
       return this;
     }
 
-    /** The symbol envelope: segment times in seconds (adding up to at most the window). */
+    /**
+     * The symbol envelope (see {@link Envelope}): segment times in seconds, finite, at least 0 and
+     * adding up to at most the window, and the sustain level in [0, 1]. Default 0.025, 0, 0,
+     * 0.025, 1.
+     */
     public Builder envelope(float attack, float decay, float sustain, float release, float level) {
-      envelope = new float[] {attack, decay, sustain, release, level};
+      envelope = new Envelope(attack, decay, sustain, release, level);
       return this;
     }
 
+    /**
+     * The configuration.
+     *
+     * @throws IllegalArgumentException naming the first value outside its range
+     */
     public DtmfConfig build() {
       require(messageBytes >= 1, "messageBytes must be at least 1");
       require(sampleRate > 0, "sampleRate must be positive");
       require(basebandDecimationFactor >= 1, "basebandDecimationFactor must be positive");
       require(windowSeconds > 0, "windowSeconds must be positive");
-      require(
-          Math.round(windowSeconds * sampleRate / basebandDecimationFactor) >= 1,
+      require(Math.round(windowSeconds * sampleRate / basebandDecimationFactor) >= 1,
           "the window must span at least one decimated sample");
       require(tonesPerSymbol >= 1, "tonesPerSymbol must be at least 1");
       int tones = toneFrequencies.length == 0 ? 10 : toneFrequencies.length;
-      require(
-          toneFrequencies.length > 0 || tonesPerSymbol == 2,
+      require(toneFrequencies.length > 0 || tonesPerSymbol == 2,
           "the default tone set makes symbols of 2 tones");
       for (float f : toneFrequencies) {
         require(f >= 0 && f < sampleRate / 2, "every tone must lie in [0, sampleRate / 2)");
@@ -178,15 +257,16 @@ public final class DtmfConfig {
       require(symbols >= 3, "the tones must make at least 3 symbols");
       require(symbols <= pairs, "there may be no more symbols than pairs of tones");
       require(symbols <= (1 << 30) / 256 + 1, "too many symbols");
-      for (int i = 0; i < 4; i++) {
+      float[] times = {envelope.attackSeconds, envelope.decaySeconds, envelope.sustainSeconds,
+          envelope.releaseSeconds};
+      for (float time : times) {
         require(
-            Float.isFinite(envelope[i]) && envelope[i] >= 0,
-            "envelope times must be finite and non-negative");
+            Float.isFinite(time) && time >= 0, "envelope times must be finite and non-negative");
       }
-      require(envelope[4] >= 0 && envelope[4] <= 1, "the sustain level must lie in [0, 1]");
-      float total = envelope[0] + envelope[1] + envelope[2] + envelope[3];
-      require(
-          total <= windowSeconds * (1 + 4 * Math.ulp(1f)),
+      require(envelope.sustainLevel >= 0 && envelope.sustainLevel <= 1,
+          "the sustain level must lie in [0, 1]");
+      float total = times[0] + times[1] + times[2] + times[3];
+      require(total <= windowSeconds * (1 + 4 * Math.ulp(1f)),
           "the envelope times add up to more than the window");
       return new DtmfConfig(this);
     }
@@ -204,12 +284,6 @@ public final class DtmfConfig {
         }
       }
       return result;
-    }
-
-    private static void require(boolean condition, String message) {
-      if (!condition) {
-        throw new IllegalArgumentException(message);
-      }
     }
   }
 

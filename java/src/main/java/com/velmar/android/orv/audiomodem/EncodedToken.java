@@ -25,6 +25,7 @@ public final class EncodedToken {
     return tokenAudio.clone();
   }
 
+  /** Sample rate of {@link #startTransition()} and {@link #tokenAudio()}, Hz. */
   public float sampleRate() {
     return sampleRate;
   }

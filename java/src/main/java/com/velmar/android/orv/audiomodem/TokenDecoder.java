@@ -7,24 +7,24 @@ import java.util.BitSet;
 import java.util.List;
 import java.util.concurrent.locks.ReadWriteLock;
 import java.util.concurrent.locks.ReentrantReadWriteLock;
+import java.util.function.Supplier;
 
 /**
  * Listens to microphone audio and reports the tokens it hears.
  *
  * <pre>{@code
- * try (TokenDecoder decoder = TokenDecoder.create(DsssConfig.defaults(), DecoderOptions.defaults())) {
- *   while (recording) {
- *     int n = audioRecord.read(pcm, 0, pcm.length);
- *     decoder.process(pcm, 0, n);
- *     for (byte[] token : decoder.tokens()) { ... }
- *   }
+ * DecoderOptions options = DecoderOptions.defaults();
+ * try (TokenDecoder decoder = TokenDecoder.create(DsssConfig.defaults(), options)) {
+ *   decoder.process(samples, 0, count);
+ *   for (byte[] token : decoder.tokens()) { ... }
  * }
  * }</pre>
  *
  * <p>The decoder keeps a history of a few token durations ({@link
  * DecoderOptions#bufferLengthTokens()}); call {@link #tokens()} at least once per such span (every
  * quarter second is typical) so that nothing heard is lost. A token heard several times is
- * reported each time it is asked for while it is in the history.
+ * reported each time it is asked for while it is in the history. A recording loop is simpler
+ * with a {@link TokenStream}, which polls for it and reports each token once per sighting.
  *
  * <p>Thread-safe: each decoder serialises its own calls, and creating or closing decoders is
  * serialised against all other calls, as the native table requires. Several decoders may be used
@@ -40,60 +40,38 @@ public final class TokenDecoder implements AutoCloseable {
 
   private final NativeDecoder peer = new NativeDecoder();
   private final int id;
+  private final String modem;
   private final int messageBytes;
   private final int crcCheckBytes;
-  private final int channels;
-  private final boolean listeningMode;
+  private final DecoderOptions options;
   private ByteBuffer chunk;
   private boolean closed;
 
   private TokenDecoder(
-      int id, int messageBytes, int crcCheckBytes, int channels, boolean listeningMode) {
+      int id, String modem, int messageBytes, int crcCheckBytes, DecoderOptions options) {
     this.id = id;
+    this.modem = modem;
     this.messageBytes = messageBytes;
     this.crcCheckBytes = crcCheckBytes;
-    this.channels = channels;
-    this.listeningMode = listeningMode;
+    this.options = options;
   }
 
   /** A DSSS decoder for transmitters using {@code config}. */
   public static TokenDecoder create(DsssConfig config, DecoderOptions options) {
-    TABLE_LOCK.writeLock().lock();
-    try {
+    return changingTable(() -> {
       int id = USED_IDS.nextClearBit(0);
       TokenDecoder decoder =
-          new TokenDecoder(
-              id,
-              config.messageBytes(),
-              config.crcCheckBytes(),
-              options.channels(),
-              options.listeningMode());
-      decoder.peer.nativeInitializeDsss(
-          id,
-          config.tokenLengthBytes(),
-          config.checksumSymbol(),
-          options.designBasebandFilter(),
-          config.numberOfTaps(),
-          config.codeNumber(),
-          config.coderSampleRate(),
-          config.upsamplingFactor(),
-          config.carrierFrequency(),
-          config.bitsPerSymbol(),
-          config.minCyclesPerFrame(),
-          config.basebandDecimationFactor(),
-          config.quadratureCarrier(),
-          options.acquisitionWindowSeconds(),
-          options.broadcasterThreshold(),
-          options.maxTokensPerCall(),
-          options.microphoneRate(),
-          options.channels(),
-          options.bufferLengthTokens(),
-          options.listeningMode());
+          new TokenDecoder(id, Token.DSSS, config.messageBytes(), config.crcCheckBytes(), options);
+      decoder.peer.nativeInitializeDsss(id, config.tokenLengthBytes(), config.checksumSymbol(),
+          options.designBasebandFilter(), config.numberOfTaps(), config.codeNumber(),
+          config.coderSampleRate(), config.upsamplingFactor(), config.carrierFrequency(),
+          config.bitsPerSymbol(), config.minCyclesPerFrame(), config.basebandDecimationFactor(),
+          config.quadratureCarrier(), options.acquisitionWindowSeconds(),
+          options.broadcasterThreshold(), options.maxTokensPerCall(), options.microphoneRate(),
+          options.channels(), options.bufferLengthTokens(), options.listeningMode());
       USED_IDS.set(id);
       return decoder;
-    } finally {
-      TABLE_LOCK.writeLock().unlock();
-    }
+    });
   }
 
   /**
@@ -107,41 +85,33 @@ public final class TokenDecoder implements AutoCloseable {
     if (options.listeningMode()) {
       throw new IllegalArgumentException("the listening mode hears DSSS transmitters only");
     }
-    TABLE_LOCK.writeLock().lock();
-    try {
+    return changingTable(() -> {
       int id = USED_IDS.nextClearBit(0);
       TokenDecoder decoder =
-          new TokenDecoder(
-              id, config.messageBytes(), config.crcCheckBytes(), options.channels(), false);
-      float[] envelope = config.envelope();
-      boolean built =
-          decoder.peer.nativeInitializeDtmf(
-              id,
-              config.tokenLengthBytes(),
-              config.checksumSymbol(),
-              config.sampleRate(),
-              config.basebandDecimationFactor(),
-              config.windowSeconds(),
-              config.tonesPerSymbol(),
-              0,
-              options.maxTokensPerCall(),
-              options.microphoneRate(),
-              options.channels(),
-              envelope[0],
-              envelope[1],
-              envelope[2],
-              envelope[3],
-              envelope[4],
-              options.bufferLengthTokens(),
-              config.toneFrequencies());
+          new TokenDecoder(id, Token.DTMF, config.messageBytes(), config.crcCheckBytes(), options);
+      DtmfConfig.Envelope envelope = config.envelope();
+      boolean built = decoder.peer.nativeInitializeDtmf(id, config.tokenLengthBytes(),
+          config.checksumSymbol(), config.sampleRate(), config.basebandDecimationFactor(),
+          config.windowSeconds(), config.tonesPerSymbol(), 0, options.maxTokensPerCall(),
+          options.microphoneRate(), options.channels(), envelope.attackSeconds(),
+          envelope.decaySeconds(), envelope.sustainSeconds(), envelope.releaseSeconds(),
+          envelope.sustainLevel(), options.bufferLengthTokens(), config.toneFrequencies());
       if (!built) {
         throw new IllegalArgumentException("the native library refused the envelope");
       }
       USED_IDS.set(id);
       return decoder;
-    } finally {
-      TABLE_LOCK.writeLock().unlock();
-    }
+    });
+  }
+
+  /** The modem this decoder hears: {@link Token#DSSS} ("dsss") or {@link Token#DTMF} ("dtmf"). */
+  public String modem() {
+    return modem;
+  }
+
+  /** The options it was created with: the microphone's rate and channels among them. */
+  public DecoderOptions options() {
+    return options;
   }
 
   /** Feeds interleaved 16-bit samples (all of {@code samples}). */
@@ -149,131 +119,115 @@ public final class TokenDecoder implements AutoCloseable {
     process(samples, 0, samples.length);
   }
 
-  /** Feeds {@code length} interleaved 16-bit samples starting at {@code offset}. */
+  /**
+   * Feeds {@code length} interleaved 16-bit samples starting at {@code offset}: a whole number of
+   * frames (samples of all channels).
+   *
+   * @throws IndexOutOfBoundsException if the region is not inside {@code samples}
+   * @throws IllegalArgumentException if {@code length} is not a whole number of frames
+   * @throws IllegalStateException if the decoder is closed
+   */
   public void process(short[] samples, int offset, int length) {
     if (offset < 0 || length < 0 || offset + length > samples.length) {
       throw new IndexOutOfBoundsException("offset " + offset + ", length " + length);
     }
-    if (length % channels != 0) {
+    if (length % options.channels() != 0) {
       throw new IllegalArgumentException("length must be a whole number of frames");
     }
-    TABLE_LOCK.readLock().lock();
-    try {
-      synchronized (this) {
-        checkOpen();
-        int step = CHUNK_FRAMES * channels;
-        if (chunk == null) {
-          chunk = ByteBuffer.allocateDirect(2 * step).order(ByteOrder.LITTLE_ENDIAN);
-        }
-        for (int start = offset; start < offset + length; start += step) {
-          int count = Math.min(step, offset + length - start);
-          chunk.clear();
-          chunk.asShortBuffer().put(samples, start, count);
-          feed(chunk, 0, 2 * count);
-        }
+    run(() -> {
+      int step = CHUNK_FRAMES * options.channels();
+      if (chunk == null) {
+        chunk = ByteBuffer.allocateDirect(2 * step).order(ByteOrder.LITTLE_ENDIAN);
       }
-    } finally {
-      TABLE_LOCK.readLock().unlock();
-    }
+      for (int start = offset; start < offset + length; start += step) {
+        int count = Math.min(step, offset + length - start);
+        chunk.clear();
+        chunk.asShortBuffer().put(samples, start, count);
+        feed(chunk, 0, 2 * count);
+      }
+    });
   }
 
   /**
-   * Feeds 16-bit little-endian interleaved PCM from a direct buffer. In the listening mode the
-   * region may be overwritten (multi-channel input is mixed down in place).
+   * Feeds 16-bit little-endian interleaved PCM from a direct buffer: {@code lengthBytes} bytes
+   * from {@code offsetBytes} on (both counted from the buffer's start, whatever its position),
+   * a whole number of frames. In the listening mode the region may be overwritten (multi-channel
+   * input is mixed down in place).
+   *
+   * @throws IllegalArgumentException if the buffer is not direct, or the region is not whole
+   *     frames of 16-bit samples inside it
+   * @throws IllegalStateException if the decoder is closed
    */
   public void process(ByteBuffer directPcm, int offsetBytes, int lengthBytes) {
     if (!directPcm.isDirect()) {
       throw new IllegalArgumentException("the buffer must be direct");
     }
-    if (offsetBytes < 0
-        || lengthBytes < 0
-        || offsetBytes % 2 != 0
-        || lengthBytes % (2 * channels) != 0
+    if (offsetBytes < 0 || lengthBytes < 0 || offsetBytes % 2 != 0
+        || lengthBytes % (2 * options.channels()) != 0
         || (long) offsetBytes + lengthBytes > directPcm.capacity()) {
       throw new IllegalArgumentException(
           "region must be whole frames of 16-bit samples inside the buffer");
     }
-    TABLE_LOCK.readLock().lock();
-    try {
-      synchronized (this) {
-        checkOpen();
-        int step = 2 * CHUNK_FRAMES * channels;
-        for (int start = offsetBytes; start < offsetBytes + lengthBytes; start += step) {
-          feed(directPcm, start, Math.min(step, offsetBytes + lengthBytes - start));
-        }
+    run(() -> {
+      int step = 2 * CHUNK_FRAMES * options.channels();
+      for (int start = offsetBytes; start < offsetBytes + lengthBytes; start += step) {
+        feed(directPcm, start, Math.min(step, offsetBytes + lengthBytes - start));
       }
-    } finally {
-      TABLE_LOCK.readLock().unlock();
-    }
+    });
   }
 
   private void feed(ByteBuffer buffer, int offsetBytes, int lengthBytes) {
-    if (listeningMode) {
+    if (options.listeningMode()) {
       peer.nativeProcessSamplesWithZintar(id, buffer, offsetBytes, lengthBytes);
     } else {
       peer.nativeProcessSamples(id, buffer, offsetBytes, lengthBytes);
     }
   }
 
-  /** The tokens in the history now (message bytes, check bytes verified and removed). */
+  /**
+   * The tokens in the history now (message bytes, check bytes verified and removed), at most
+   * {@link DecoderOptions#maxTokensPerCall()} of them.
+   *
+   * @throws IllegalStateException if the decoder is closed
+   */
   public List<byte[]> tokens() {
-    List<byte[]> tokens = new ArrayList<>();
-    TABLE_LOCK.readLock().lock();
-    try {
-      synchronized (this) {
-        checkOpen();
-        peer.nativeGetTokens(id, (TokenReceiver) tokens::add, messageBytes, crcCheckBytes);
-      }
-    } finally {
-      TABLE_LOCK.readLock().unlock();
-    }
-    return tokens;
+    Collector collector = new Collector();
+    run(() -> peer.nativeGetTokens(id, collector, messageBytes, crcCheckBytes));
+    return collector.tokens;
   }
 
-  /** Whether a transmitter is audible now (it may not be decodable yet). */
+  /**
+   * Whether a DSSS transmitter is audible now (it may not be decodable yet); always false for
+   * DTMF.
+   *
+   * @throws IllegalStateException if the decoder is closed
+   */
   public boolean broadcasterDetected() {
-    TABLE_LOCK.readLock().lock();
-    try {
-      synchronized (this) {
-        checkOpen();
-        return peer.nativeDetectBroadcaster(id);
-      }
-    } finally {
-      TABLE_LOCK.readLock().unlock();
-    }
+    return call(() -> peer.nativeDetectBroadcaster(id));
   }
 
-  /** Forgets everything heard so far. */
+  /**
+   * Forgets everything heard so far.
+   *
+   * @throws IllegalStateException if the decoder is closed
+   */
   public void wipe() {
-    TABLE_LOCK.readLock().lock();
-    try {
-      synchronized (this) {
-        checkOpen();
-        peer.nativeWipeInternalData(id);
-      }
-    } finally {
-      TABLE_LOCK.readLock().unlock();
-    }
+    run(() -> peer.nativeWipeInternalData(id));
   }
 
-  /** 16-bit samples (all channels) the next native call may carry without dropping history. */
+  /**
+   * 16-bit samples (all channels) the next native call may carry without dropping history.
+   *
+   * @throws IllegalStateException if the decoder is closed
+   */
   public int maxSafeInputSamples() {
-    TABLE_LOCK.readLock().lock();
-    try {
-      synchronized (this) {
-        checkOpen();
-        return peer.nativeGetMaxSafeInputSize(id) / 2;
-      }
-    } finally {
-      TABLE_LOCK.readLock().unlock();
-    }
+    return call(() -> peer.nativeGetMaxSafeInputSize(id) / 2);
   }
 
   /** Frees the native decoder. Idempotent. */
   @Override
   public void close() {
-    TABLE_LOCK.writeLock().lock();
-    try {
+    changingTable(() -> {
       synchronized (this) {
         if (!closed) {
           peer.nativeRelease(id);
@@ -281,14 +235,50 @@ public final class TokenDecoder implements AutoCloseable {
           closed = true;
         }
       }
+      return null;
+    });
+  }
+
+  // Creating or releasing a native decoder: no other call may run meanwhile.
+  private static <T> T changingTable(Supplier<T> change) {
+    TABLE_LOCK.writeLock().lock();
+    try {
+      return change.get();
     } finally {
       TABLE_LOCK.writeLock().unlock();
     }
   }
 
-  private void checkOpen() {
-    if (closed) {
-      throw new IllegalStateException("decoder is closed");
+  // A call on this decoder's native state: the table stays put, this decoder serves one caller.
+  private <T> T call(Supplier<T> use) {
+    TABLE_LOCK.readLock().lock();
+    try {
+      synchronized (this) {
+        if (closed) {
+          throw new IllegalStateException("decoder is closed");
+        }
+        return use.get();
+      }
+    } finally {
+      TABLE_LOCK.readLock().unlock();
+    }
+  }
+
+  private void run(Runnable use) {
+    call(() -> {
+      use.run();
+      return null;
+    });
+  }
+
+  // The receiver of nativeGetTokens: a named class rather than a lambda, so that the shrink test
+  // sees the callback as an app's shrinker (which turns lambdas into such classes) does.
+  private static final class Collector implements TokenReceiver {
+    final List<byte[]> tokens = new ArrayList<>();
+
+    @Override
+    public void addToken(byte[] token) {
+      tokens.add(token);
     }
   }
 }

@@ -32,21 +32,11 @@ public final class TokenEncoder implements AutoCloseable {
   public static TokenEncoder create(DsssConfig config) {
     synchronized (LOCK) {
       TokenEncoder encoder = new TokenEncoder(config.messageBytes(), config.crcCheckBytes());
-      encoder.peer.nativeInitializeDsss(
-          config.tokenLengthBytes(),
-          config.checksumSymbol(),
-          config.singleSideband(),
-          config.numberOfTaps(),
-          config.codeNumber(),
-          config.coderSampleRate(),
-          config.upsamplingFactor(),
-          config.carrierFrequency(),
-          config.bitsPerSymbol(),
-          config.minCyclesPerFrame(),
-          config.basebandDecimationFactor(),
-          config.quadratureCarrier(),
-          config.broadcastSampleRate(),
-          config.transitionSeconds());
+      encoder.peer.nativeInitializeDsss(config.tokenLengthBytes(), config.checksumSymbol(),
+          config.singleSideband(), config.numberOfTaps(), config.codeNumber(),
+          config.coderSampleRate(), config.upsamplingFactor(), config.carrierFrequency(),
+          config.bitsPerSymbol(), config.minCyclesPerFrame(), config.basebandDecimationFactor(),
+          config.quadratureCarrier(), config.broadcastSampleRate(), config.transitionSeconds());
       current = encoder;
       return encoder;
     }
@@ -60,21 +50,12 @@ public final class TokenEncoder implements AutoCloseable {
   public static TokenEncoder create(DtmfConfig config) {
     synchronized (LOCK) {
       TokenEncoder encoder = new TokenEncoder(config.messageBytes(), config.crcCheckBytes());
-      float[] envelope = config.envelope();
-      boolean built =
-          encoder.peer.nativeInitializeDtmf(
-              config.tokenLengthBytes(),
-              config.checksumSymbol(),
-              config.sampleRate(),
-              config.basebandDecimationFactor(),
-              config.windowSeconds(),
-              config.tonesPerSymbol(),
-              envelope[0],
-              envelope[1],
-              envelope[2],
-              envelope[3],
-              envelope[4],
-              config.toneFrequencies());
+      DtmfConfig.Envelope envelope = config.envelope();
+      boolean built = encoder.peer.nativeInitializeDtmf(config.tokenLengthBytes(),
+          config.checksumSymbol(), config.sampleRate(), config.basebandDecimationFactor(),
+          config.windowSeconds(), config.tonesPerSymbol(), envelope.attackSeconds(),
+          envelope.decaySeconds(), envelope.sustainSeconds(), envelope.releaseSeconds(),
+          envelope.sustainLevel(), config.toneFrequencies());
       if (!built) {
         throw new IllegalArgumentException("the native library refused the envelope");
       }
