@@ -5,19 +5,22 @@
 #            for the Android x86 ABI: the C++ suites;
 #   sanitize x86-64 under AddressSanitizer and UndefinedBehaviorSanitizer:
 #            the C++ suites.
+#   fuzz     every libFuzzer target (clang, ASan, UBSan) for 30 s from its
+#            seed corpus (scripts/fuzz.sh).
 # Installs missing packages first, only those the chosen builds need.
 # VESK_TEST_BUILDS="host i686" picks builds.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
 JOBS=${JOBS:-$(nproc)}
-BUILDS=${VESK_TEST_BUILDS:-host i686 sanitize}
+BUILDS=${VESK_TEST_BUILDS:-host i686 sanitize fuzz}
 
 groups=(build test)
 for b in $BUILDS; do
   case $b in
     host) groups+=(java) ;;
     i686) groups+=(i686) ;;
+    fuzz) groups+=(fuzz) ;;
   esac
 done
 ./scripts/setup.sh "${groups[@]}"
@@ -39,6 +42,7 @@ for b in $BUILDS; do
             -DVESK_BUILD_JAVA=OFF -DVESK_BUILD_BENCHMARKS=OFF ;;
     sanitize) configure_and_build sanitize -DVESK_SANITIZE=ON -DVESK_BUILD_JAVA=OFF \
                 -DVESK_BUILD_BENCHMARKS=OFF ;;
+    fuzz) JOBS=$JOBS ./scripts/fuzz.sh 30; continue ;;
     *) echo "unknown build: $b" >&2; exit 2 ;;
   esac
   (cd "build/$b" && ctest --output-on-failure -j "$JOBS")

@@ -54,7 +54,9 @@ std::vector<Seed> Configurations() {
   FuzzModemConfig listening = dsss;
   listening.listening_mode = true;
   FuzzModemConfig dtmf = FuzzModemConfig::Dtmf();
-  return {{"dsss", dsss}, {"dsss_44k_coder_stereo", coder44100}, {"listening", listening},
+  return {{"dsss", dsss},
+          {"dsss_44k_coder_stereo", coder44100},
+          {"listening", listening},
           {"dtmf", dtmf}};
 }
 

@@ -27,8 +27,11 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     if (!DsssEncoderConfigError(dsss).empty()) return 0;
     encoder = MakeDsssAudioModemEncoder(dsss);
   }
-  // The message: the configured length, or (a wrong one) any other.
+  // The message: the configured length, or (a wrong one) any other. Never
+  // empty: every entry point refuses an empty message before the encoder
+  // sees it, and the CRC coder's fatal check guards that contract.
   const size_t length = input.Bool() ? input.Byte() : static_cast<size_t>(config.message_bytes);
+  if (length < 1 || config.message_bytes < 1) return 0;
   std::vector<uint8_t> message;
   for (size_t i = 0; i < length; ++i) message.push_back(input.Byte());
   std::vector<float> audio, transition;

@@ -1,7 +1,9 @@
 #include "social/tandry/audio/fuzz_modem_config.h"
 
 #include <algorithm>
+#include <cmath>
 #include <initializer_list>
+#include <sstream>
 
 namespace audio_modem {
 namespace {
@@ -44,6 +46,53 @@ class Writer {
 
  private:
   base::FuzzSeed* seed_;
+};
+
+// Draws fields at random around their edges (RandomFuzzModemConfig). Most
+// fields keep the value they have (the product's), so that a configuration
+// differs from a sound one in a few places and validation is reached past
+// as well as tripped; flags are a coin toss.
+class Randomizer {
+ public:
+  explicit Randomizer(std::mt19937* random) : random_(random) {}
+  void Flag(bool* value) { *value = Uniform(0, 1) == 1; }
+  void Int(int* value, int lo, int hi, std::initializer_list<int> edges) {
+    if (Keep()) return;
+    const int edge = edges.begin()[Uniform(0, static_cast<int64_t>(edges.size()) - 1)];
+    switch (Uniform(0, 2)) {
+      case 0:
+        *value = edge;
+        break;
+      case 1:
+        *value = std::clamp(edge + static_cast<int>(Uniform(0, 2)) - 1, lo, hi);
+        break;
+      default:
+        *value = static_cast<int>(Uniform(lo, hi));
+    }
+  }
+  void Real(float* value, std::initializer_list<float> edges) {
+    if (Keep()) return;
+    const float edge = edges.begin()[Uniform(0, static_cast<int64_t>(edges.size()) - 1)];
+    switch (Uniform(0, 2)) {
+      case 0:
+        *value = edge;
+        break;
+      case 1:
+        *value = edge * std::uniform_real_distribution<float>(0.97f, 1.03f)(*random_);
+        break;
+      default:
+        // From a thousandth to a thousand times the edge, now and then negative.
+        *value = (Uniform(0, 9) == 0 ? -1.0f : 1.0f) * (edge == 0 ? 1.0f : edge) *
+                 std::pow(10.0f, std::uniform_real_distribution<float>(-3, 3)(*random_));
+    }
+  }
+
+ private:
+  bool Keep() { return Uniform(0, 9) != 0; }
+  int64_t Uniform(int64_t lo, int64_t hi) {
+    return std::uniform_int_distribution<int64_t>(lo, hi)(*random_);
+  }
+  std::mt19937* random_;
 };
 
 template <typename Io>
@@ -161,6 +210,41 @@ void WriteFuzzModemConfig(const FuzzModemConfig& config, base::FuzzSeed* seed) {
   FuzzModemConfig copy = config;
   Writer writer(seed);
   Visit(&writer, &copy);
+}
+
+FuzzModemConfig RandomFuzzModemConfig(std::mt19937* random) {
+  FuzzModemConfig config;
+  Randomizer randomizer(random);
+  Visit(&randomizer, &config);
+  return config;
+}
+
+std::string DescribeFuzzModemConfig(const FuzzModemConfig& c) {
+  std::ostringstream out;
+  out << (c.dtmf ? "dtmf" : "dsss") << " message_bytes=" << c.message_bytes
+      << " crc=" << c.crc_check_bytes << " checksum=" << c.checksum_symbol;
+  if (c.dtmf) {
+    const DtmfWaveformConfig& t = c.dtmf_waveform;
+    out << " rate=" << t.sample_rate << " decimation=" << t.baseband_decimation_factor
+        << " window=" << t.window_duration << " tones_per_symbol=" << t.tones_per_symbol
+        << " envelope=" << t.attack_time << "/" << t.decay_time << "/" << t.sustain_time << "/"
+        << t.release_time << "/" << t.sustain_amplitude << " tones=";
+    for (const float tone : t.tone_frequencies) out << tone << ",";
+  } else {
+    const DsssWaveformConfig& w = c.dsss;
+    out << " taps=" << w.number_of_taps << " code=" << w.code_number
+        << " coder_rate=" << w.sample_rate << " upsampling=" << w.upsampling_factor
+        << " decimation=" << w.baseband_decimation_factor << " carrier=" << w.carrier_frequency
+        << " bits=" << w.bits_per_symbol << " cycles=" << w.min_cycles_per_frame
+        << " quadrature=" << w.use_quadrature_carrier << " ssb=" << c.single_sideband
+        << " broadcast=" << c.broadcast_sample_rate << " transition=" << c.transition_seconds
+        << " listening=" << c.listening_mode << " window=" << c.acquisition_window_seconds
+        << " threshold=" << c.broadcaster_threshold
+        << " designed_filter=" << c.design_baseband_filter;
+  }
+  out << " mic=" << c.microphone_rate << " channels=" << c.channels
+      << " tokens_per_call=" << c.max_tokens_per_call << " buffer=" << c.buffer_length_tokens;
+  return out.str();
 }
 
 void RunFuzzDecoderCalls(base::FuzzInput* input, int channels, const FuzzDecoderCalls& calls) {

@@ -10,6 +10,8 @@
 
 #include <cstdint>
 #include <functional>
+#include <random>
+#include <string>
 #include <vector>
 
 #include "base/fuzz_input.h"
@@ -54,6 +56,16 @@ struct FuzzModemConfig {
 // Reads a configuration; Write makes the bytes that read back as `config`.
 FuzzModemConfig ReadFuzzModemConfig(base::FuzzInput* input);
 void WriteFuzzModemConfig(const FuzzModemConfig& config, base::FuzzSeed* seed);
+
+// A configuration drawn at random around the same edges, for property
+// tests: the product DSSS configuration with, on average, one field in ten
+// changed to one of its edge values, a value near one (within 3 %, or one
+// step for integers) or anywhere in its range; flags are coin tosses.
+// Deterministic for a seeded `random`.
+FuzzModemConfig RandomFuzzModemConfig(std::mt19937* random);
+
+// One line naming every field, for reports.
+std::string DescribeFuzzModemConfig(const FuzzModemConfig& config);
 
 // One `process` call of a decoder fuzz target: whole frames of interleaved
 // samples, and two details a target may use: where to cut them into two

@@ -17,8 +17,8 @@ TEST(NativeDecoderTest, ListeningModeTakesBuffersAtOddAddresses) {
   FakeJniEnv jni;
   jobject thiz = jni.PlainObject();
   ASSERT_TRUE(Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDsss(
-      jni.env(), thiz, 0, 8, false, false, 7, 0, 48000, 16, 18500, 4, 4, 4, false, 0.75f, 5.0f,
-      2, 48000, 2, 4.0f, true));
+      jni.env(), thiz, 0, 8, false, false, 7, 0, 48000, 16, 18500, 4, 4, 4, false, 0.75f, 5.0f, 2,
+      48000, 2, 4.0f, true));
   const std::vector<int16_t> stereo = {10, 20, 30, 40, -3, 0, 100, 101};
   for (const size_t shift : {size_t{0}, size_t{1}}) {
     std::vector<uint8_t> memory(2 + 2 * stereo.size());

@@ -31,8 +31,8 @@ bool Initialize(vesk_jni::FakeJniEnv* jni, jobject thiz, int id, int kind, int c
           channels, 4.0f, kind == 2);
     default:  // The product DTMF waveform.
       return Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDtmf(
-          env, thiz, id, 5, true, 44100, 16, 0.05f, 2, 0, 2, 44100, channels, 0.025f, 0, 0,
-          0.025f, 1, 4.0f, jni->FloatArray({}));
+          env, thiz, id, 5, true, 44100, 16, 0.05f, 2, 0, 2, 44100, channels, 0.025f, 0, 0, 0.025f,
+          1, 4.0f, jni->FloatArray({}));
   }
 }
 
@@ -64,9 +64,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
       Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeProcessSamplesWithZintar(
           env, thiz, id, buffer, offset, length);
     } else {
-      Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeProcessSamples(env, thiz, id,
-                                                                                buffer, offset,
-                                                                                length);
+      Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeProcessSamples(
+          env, thiz, id, buffer, offset, length);
     }
   };
   calls.tokens = [&] {
