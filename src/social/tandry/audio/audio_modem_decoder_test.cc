@@ -177,6 +177,36 @@ TEST(AudioModemDecoderTest, ConfigLimitsAreInclusive) {
   EXPECT_EQ(DtmfEncoderConfigError(long_token), "a token may last at most 30 s on air");
 }
 
+// The listening kind hears floats (values of 16-bit samples) exactly as it
+// hears the 16-bit samples themselves.
+TEST(AudioModemDecoderTest, ListeningFromFloatsEqualsListeningFrom16Bit) {
+  DsssDecoderConfig config;
+  config.input_sample_rate = 48000;
+  config.num_channels = 2;
+  config.use_zintar = true;
+  const auto from_floats = MakeDsssAudioModemDecoder(config);
+  const auto from_pcm = MakeDsssAudioModemDecoder(config);
+  std::vector<float> stereo;
+  for (const float s : Played(kMessage, 2)) stereo.insert(stereo.end(), {s, -s / 3});
+  bool woke = false;
+  for (size_t start = 0; start + 8192 <= stereo.size(); start += 8192) {
+    const std::vector<float> block(stereo.begin() + start, stereo.begin() + start + 8192);
+    std::vector<int16_t> pcm(block.begin(), block.end());
+    from_floats->ProcessSamples(block);
+    from_pcm->ProcessSamplesWithZintar(pcm.data(), static_cast<int>(pcm.size()));
+    ASSERT_EQ(from_floats->listening(), from_pcm->listening()) << start;
+    ASSERT_EQ(from_floats->GetMaxSafeInputSize(), from_pcm->GetMaxSafeInputSize()) << start;
+    woke |= !from_pcm->listening();
+  }
+  EXPECT_TRUE(woke);
+  DecodeResults a, b;
+  ASSERT_TRUE(from_floats->GetTokens(&a, 6, 2));
+  ASSERT_TRUE(from_pcm->GetTokens(&b, 6, 2));
+  EXPECT_EQ(a.tokens[0].bytes, kMessage);
+  EXPECT_EQ(a.frame_times, b.frame_times);
+  EXPECT_EQ(a.frame_scores, b.frame_scores);
+}
+
 TEST(AudioModemDecoderDeathTest, ChecksItsArguments) {
   EXPECT_DEATH(AudioModemDecoder(std::unique_ptr<audio_vesknet::VesknetDecoder>()),
                "Check failed: 'dsss_decoder' Must be non-null");

@@ -90,7 +90,8 @@ void ZintarDecoder::ProcessSamples(int16_t* samples, int count) {
       samples[mono_count++] = static_cast<int16_t>((samples[i] + samples[i + 1]) / 2);
     }
   }
-  if (!Wakes(zintar_detector_->Process(samples, mono_count))) return;
+  last_score_ = zintar_detector_->Process(samples, mono_count);
+  if (!Wakes(last_score_)) return;
 
   state_ = kDetected;
   activity_ms_ = clock_();

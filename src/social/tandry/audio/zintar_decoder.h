@@ -89,6 +89,9 @@ class ZintarDecoder {
   int token_size() const;
 
   State state() const { return state_; }
+  // The detector's score of the latest block heard while listening (0 before
+  // the first).
+  float last_score() const { return last_score_; }
   // Whether a block score wakes the decoder: strictly above the threshold.
   static bool Wakes(float score) { return score > kDetectionThreshold; }
   const audio_vesknet::VesknetDecoder& dsss_decoder() const { return *dsss_decoder_; }
@@ -107,6 +110,7 @@ class ZintarDecoder {
   State state_ = kListening;
   Clock clock_;
   int64_t activity_ms_;  // Last detection or positive answer.
+  float last_score_ = 0.0f;
   std::vector<float> floats_;
 };
 

@@ -1,5 +1,7 @@
 #include "social/tandry/audio/zintar_decoder.h"
 
+#include <cmath>
+#include <random>
 #include <vector>
 
 #include "gtest/gtest.h"
@@ -28,6 +30,7 @@ struct Fixture {
     auto coder = MakeSymbolWaveCoder(DsssWaveformConfig());
     audio_vesknet::VesknetDecoderParams params;
     params.symbols_in_token = 16;
+    params.save_received_samples = true;  // What the DSSS decoder was handed.
     auto dsss = std::make_unique<audio_vesknet::VesknetDecoder>(std::move(coder), params);
     decoder = std::make_unique<ZintarDecoder>(
         std::move(dsss), ZintarDetectorHolder::Create(48000, channels), [this] { return now_ms; });
@@ -95,6 +98,18 @@ TEST(ZintarDecoderTest, FallsBackOnlyAfterMoreThanASecondWithoutAnswers) {
   g.now_ms = 1001;
   EXPECT_FALSE(g.decoder->DetectBroadcaster());
   EXPECT_EQ(g.decoder->state(), ZintarDecoder::kListening);
+
+  // Waking restarts the timer: detection at 5000, then false answers.
+  Fixture late(1);
+  late.now_ms = 5000;
+  ASSERT_GE(late.FeedUntilDetected(ProductTransmission()), 0);
+  late.decoder->WipeInternalData();
+  late.now_ms = 6000;
+  EXPECT_FALSE(late.decoder->GetToken(&results));
+  EXPECT_EQ(late.decoder->state(), ZintarDecoder::kDetected);
+  late.now_ms = 6001;
+  EXPECT_FALSE(late.decoder->GetToken(&results));
+  EXPECT_EQ(late.decoder->state(), ZintarDecoder::kListening);
 }
 
 TEST(ZintarDecoderTest, PositiveAnswersKeepItAwake) {
@@ -156,6 +171,102 @@ TEST(ZintarDecoderTest, HistoryHoldsWholeFramesForAnyChannelCount) {
   EXPECT_LE(held, 2057 + 10);
   // Once awake, the safe size is the DSSS decoder's free space alone.
   EXPECT_GT(seven.decoder->GetMaxSafeInputSize(), 2057 * 7);
+}
+
+// Feeds `pcm` to `decoder` in blocks of `block` samples until it wakes;
+// the samples fed, or all of `pcm` when it never wakes.
+size_t FeedInBlocks(ZintarDecoder* decoder, std::vector<int16_t> pcm, size_t block) {
+  size_t start = 0;
+  while (start < pcm.size() && decoder->state() == ZintarDecoder::kListening) {
+    const size_t n = std::min(block, pcm.size() - start);
+    decoder->ProcessSamples(pcm.data() + start, static_cast<int>(n));
+    start += n;
+  }
+  return start;
+}
+
+std::vector<float> Floats(const int16_t* begin, const int16_t* end) {
+  return std::vector<float>(begin, end);
+}
+
+// What the DSSS decoder is handed on waking: exactly the last 14400 samples
+// heard (of a long block, its first 14400), and after falling back and
+// waking again only what was heard since.
+TEST(ZintarDecoderTest, WakingHandsOverExactlyTheHistory) {
+  std::vector<int16_t> pcm(3 * 4096 + 100, 7);  // Quiet first: the history fills up.
+  const std::vector<int16_t> token = ProductTransmission();
+  pcm.insert(pcm.end(), token.begin(), token.end());
+
+  Fixture blocks(1);
+  const size_t fed = FeedInBlocks(blocks.decoder.get(), pcm, 4096);
+  ASSERT_EQ(blocks.decoder->state(), ZintarDecoder::kDetected);
+  EXPECT_EQ(blocks.decoder->dsss_decoder().GetReceivedSamples(),
+            Floats(pcm.data() + fed - 14400, pcm.data() + fed));
+
+  Fixture long_block(1);
+  long_block.decoder->ProcessSamples(
+      std::vector<int16_t>(token.begin(), token.begin() + 30000).data(), 30000);
+  ASSERT_EQ(long_block.decoder->state(), ZintarDecoder::kDetected);
+  EXPECT_EQ(long_block.decoder->dsss_decoder().GetReceivedSamples(),
+            Floats(token.data(), token.data() + 14400));
+
+  // Fall back (no answers for over a second), then hear 6000 samples of
+  // quiet and the token again: the second hand-over starts with the quiet.
+  long_block.decoder->WipeInternalData();
+  long_block.now_ms = 2000;
+  audio_vesknet::VesknetDecodeResults results;
+  ASSERT_FALSE(long_block.decoder->GetToken(&results));
+  ASSERT_EQ(long_block.decoder->state(), ZintarDecoder::kListening);
+  std::vector<int16_t> again(6000, -5);
+  again.insert(again.end(), token.begin(), token.end());
+  const size_t refed = FeedInBlocks(long_block.decoder.get(), again, 4000);
+  ASSERT_EQ(long_block.decoder->state(), ZintarDecoder::kDetected);
+  const size_t handed = std::min<size_t>(refed, 14400);
+  EXPECT_EQ(long_block.decoder->dsss_decoder().GetReceivedSamples(),
+            Floats(again.data() + refed - handed, again.data() + refed));
+}
+
+// The detector's score of each 4096-sample block, for seeded noise, a tone
+// at the centre frequency and the product token (values of this
+// implementation, pinned: they change with any tap, window, table or
+// normalisation of the detector).
+TEST(ZintarDecoderTest, BlockScoresArePinned) {
+  std::vector<int16_t> noise(3 * 4096), tone(3 * 4096);
+  std::mt19937 random(1);
+  std::normal_distribution<float> gauss(0, 3000);
+  for (int16_t& s : noise) s = static_cast<int16_t>(std::lround(gauss(random)));
+  for (size_t i = 0; i < tone.size(); ++i) {
+    tone[i] =
+        static_cast<int16_t>(std::lround(10000 * std::sin(2 * M_PI * 18496.0625 * i / 48000)));
+  }
+  const std::vector<int16_t> token = ProductTransmission();
+  struct Case {
+    const std::vector<int16_t>* pcm;
+    std::vector<float> scores;
+  };
+  const Case cases[] = {
+      {&noise, {5.285364f, 5.73144f, 5.760193f}},
+      {&tone, {2.434895f, 2.434876f, 2.434667f}},
+      {&token, {62.56318f, 58.48773f, 61.45462f, 58.63065f, 59.25503f, 58.93664f}},
+  };
+  for (const Case& c : cases) {
+    const auto detector = ZintarDetectorHolder::Create(48000, 1);
+    Fixture mono(1), stereo(2);
+    for (size_t b = 0; b < c.scores.size(); ++b) {
+      std::vector<int16_t> block(c.pcm->begin() + b * 4096, c.pcm->begin() + (b + 1) * 4096);
+      EXPECT_NEAR(detector->Process(block.data(), 4096), c.scores[b], 1e-4 * c.scores[b])
+          << "block " << b;
+      // The decoders score what they hear while listening: as stereo with
+      // both channels alike, the same as in mono.
+      if (mono.decoder->state() == ZintarDecoder::kDetected) continue;
+      std::vector<int16_t> both;
+      for (const int16_t s : block) both.insert(both.end(), {s, s});
+      mono.decoder->ProcessSamples(block.data(), 4096);
+      stereo.decoder->ProcessSamples(both.data(), 8192);
+      EXPECT_NEAR(mono.decoder->last_score(), c.scores[b], 1e-4 * c.scores[b]) << "block " << b;
+      EXPECT_EQ(stereo.decoder->last_score(), mono.decoder->last_score()) << "block " << b;
+    }
+  }
 }
 
 TEST(ZintarDecoderTest, NoDetectorBelowTheCentreFrequency) {
