@@ -144,6 +144,7 @@ Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeProcessSamplesWithZin
   AudioModemDecoder* decoder = FindDecoder(id, "nativeProcessSamplesWithZintar()");
   if (decoder == nullptr) return;
   int16_t* samples = const_cast<int16_t*>(pcm);
+  if (count == 0) return;  // Nothing to hear (the listening mode ignores empty blocks).
   if (reinterpret_cast<uintptr_t>(samples) % alignof(int16_t) == 0) {
     // The listening mode mixes stereo down in place, in the host's buffer.
     decoder->ProcessSamplesWithZintar(samples, count);
