@@ -4,14 +4,19 @@
 #   i686     32-bit x86 (-m32 -march=i686 -mssse3 -mfpmath=sse), the stand-in
 #            for the Android x86 ABI: the C++ suites;
 #   sanitize x86-64 under AddressSanitizer and UndefinedBehaviorSanitizer:
-#            the C++ suites.
+#            the C++ suites;
+#   web      the WebAssembly module in Node.js and the page in headless
+#            Chromium (scripts/test-web.sh); by default only where the web
+#            toolchain can be installed.
 # Installs missing packages first, only those the chosen builds need.
 # VESK_TEST_BUILDS="host i686" picks builds.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
 JOBS=${JOBS:-$(nproc)}
-BUILDS=${VESK_TEST_BUILDS:-host i686 sanitize}
+BUILDS=${VESK_TEST_BUILDS:-host i686 sanitize web}
+# The default builds run the web tests only where their toolchain installs.
+[ -n "${VESK_TEST_BUILDS:-}" ] || web_optional=--if-installable
 
 groups=(build test)
 for b in $BUILDS; do
@@ -39,6 +44,7 @@ for b in $BUILDS; do
             -DVESK_BUILD_JAVA=OFF -DVESK_BUILD_BENCHMARKS=OFF ;;
     sanitize) configure_and_build sanitize -DVESK_SANITIZE=ON -DVESK_BUILD_JAVA=OFF \
                 -DVESK_BUILD_BENCHMARKS=OFF ;;
+    web) ./scripts/test-web.sh ${web_optional:-}; continue ;;
     *) echo "unknown build: $b" >&2; exit 2 ;;
   esac
   (cd "build/$b" && ctest --output-on-failure -j "$JOBS")
