@@ -53,7 +53,7 @@ EOF
     { cat "$apt_dir/update.log" >&2; return 1; }
   # The host build's version when it is installed, else the suite's.
   local package=kissfft version
-  version=$(dpkg-query -W -f='${Version}' libkissfft-dev 2>/dev/null || true)
+  version=$(dpkg-query -W -f='${Version}\n' libkissfft-dev 2>/dev/null | head -n 1 || true)
   [ -n "$version" ] && package="kissfft=$version"
   if ! (cd "$apt_dir" && retry_once apt-get "${apt_opts[@]}" source --download-only "$package") \
     > "$apt_dir/source.log" 2>&1; then
@@ -66,7 +66,7 @@ EOF
   (cd "$apt_dir" && dpkg-source -x kissfft_*.dsc "$kissfft") > "$apt_dir/unpack.log" 2>&1 ||
     { cat "$apt_dir/unpack.log" >&2; return 1; }
   rm -rf "$apt_dir/lists" "$apt_dir/cache"
-  echo "build-web: kissfft $(cd "$apt_dir" && ls kissfft_*.dsc) unpacked in ${kissfft#"$PWD"/}"
+  echo "build-web: $(cd "$apt_dir" && basename kissfft_*.dsc .dsc) unpacked in ${kissfft#"$PWD"/}"
 }
 
 [ -f "$kissfft/kiss_fftr.c" ] || fetch_kissfft
