@@ -177,22 +177,28 @@ async function listen() {
          'http://localhost or over HTTPS.', true);
     return;
   }
-  let stream;
+  // One start at a time: the button waits for the microphone's answer.
+  $('listen-button').disabled = true;
   try {
-    stream = await navigator.mediaDevices.getUserMedia({
-      audio: { echoCancellation: false, noiseSuppression: false, autoGainControl: false,
-               channelCount: 1 },
-    });
-  } catch (error) {
-    show('listen-status', microphoneError(error), true);
-    return;
-  }
-  const session = { stream, context: null, decoder: null, frame: 0 };
-  try {
-    await startSession(session, config);
-  } catch (error) {
-    endSession(session);
-    show('listen-status', `Listening failed: ${error.message}`, true);
+    let stream;
+    try {
+      stream = await navigator.mediaDevices.getUserMedia({
+        audio: { echoCancellation: false, noiseSuppression: false, autoGainControl: false,
+                 channelCount: 1 },
+      });
+    } catch (error) {
+      show('listen-status', microphoneError(error), true);
+      return;
+    }
+    const session = { stream, context: null, decoder: null, frame: 0 };
+    try {
+      await startSession(session, config);
+    } catch (error) {
+      endSession(session);
+      show('listen-status', `Listening failed: ${error.message}`, true);
+    }
+  } finally {
+    $('listen-button').disabled = false;
   }
 }
 
@@ -216,7 +222,7 @@ async function startSession(session, config) {
   if (rate < needed) {
     endSession(session);
     show('listen-status', `The microphone delivers ${rate} Hz, too low for ` +
-         `${NAMES[config.modem]}, which needs at least ${needed} Hz. ` +
+         `${NAMES[config.modem]}, which needs at least ${Math.ceil(needed)} Hz. ` +
          (config.modem === 'dsss' ? 'Choose DTMF, or use another microphone.' :
            'Use another microphone.'), true);
     return;

@@ -17,8 +17,8 @@
 // defaults, and the C interface validates them, so refusals carry its
 // sentences. Records handed back use the C names too. Objects that own
 // WebAssembly memory (encoders, decoders) free it in close(); a closed object
-// throws when used. Single-threaded: an object is used by one thread (the
-// page, a worker) at a time.
+// throws when used. Single-threaded: the module and its objects live on the
+// thread that loaded it.
 //
 // scripts/build-web.sh appends this file to Emscripten's loader, which
 // defines createVeskModule, to make dist/vesk.js.
@@ -192,6 +192,9 @@ function completeConfig(runtime, given = {}) {
   for (const [key, value] of Object.entries(given)) {
     if (key === 'modem') continue;
     if (key === 'dsss' || key === 'dtmf') {
+      if (value != null && typeof value !== 'object') {
+        throw new TypeError(`${key} must be an object of waveform fields`);
+      }
       for (const [inner, innerValue] of Object.entries(value ?? {})) {
         if (!(inner in config[key])) throw new TypeError(`unknown field ${key}.${inner}`);
         config[key][inner] = innerValue;
@@ -240,7 +243,8 @@ function withConfig(runtime, config, use) {
     if (tones && tones.length > 0) {
       tonesPtr = runtime.alloc(tones.length * 4);
       tones.forEach((tone, i) => {
-        runtime.views().f32[(tonesPtr >> 2) + i] = toField(`dtmf.tone_frequencies_hz[${i}]`, 'f32', tone);
+        const value = toField(`dtmf.tone_frequencies_hz[${i}]`, 'f32', tone);
+        runtime.views().f32[(tonesPtr >> 2) + i] = value;
       });
       flat.dtmf.tone_frequencies_hz = tonesPtr;
     }
@@ -352,7 +356,8 @@ class Encoder {
       rt.views().u8.set(bytes, messagePtr);
       rt.call('vesk_encoder_encode', this.#ptr, messagePtr, bytes.length, pcm);
       const record = rt.read('pcm', pcm);
-      const pcm16 = rt.views().i16.subarray(record.samples >> 1, (record.samples >> 1) + record.num_samples);
+      const first = record.samples >> 1;
+      const pcm16 = rt.views().i16.subarray(first, first + record.num_samples);
       const samples = new Float32Array(record.num_samples);
       for (let i = 0; i < samples.length; ++i) samples[i] = pcm16[i] / 32768;
       rt.m._vesk_pcm_free(pcm);

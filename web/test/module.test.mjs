@@ -218,6 +218,7 @@ test('refusals carry the C interface\'s status and sentence', () => {
   // What the C types cannot hold is the binding's to refuse.
   assert.throws(() => vesk.encoder({ mesage_bytes: 6 }), /unknown config field mesage_bytes/);
   assert.throws(() => vesk.encoder({ dsss: { carrier: 1 } }), /unknown field dsss.carrier/);
+  assert.throws(() => vesk.encoder({ dsss: 18500 }), /dsss must be an object/);
   assert.throws(() => vesk.decoder({}, { rate: 48000 }), /unknown decoder option rate/);
   assert.throws(() => vesk.encoder({ modem: 'fsk' }), /modem must be 'dsss' or 'dtmf'/);
   assert.throws(() => vesk.encoder({ message_bytes: 6.5 }),
