@@ -70,9 +70,19 @@ vesk_status Guarded(Body&& body) {
 
 bool IsFlag(int value) { return value == 0 || value == 1; }
 
+// The modem field as the int that a C caller may have stored in it. Read as
+// the C++ enum, a value other than 0 or 1 would be undefined behaviour.
+int ModemValue(const vesk_config& config) {
+  static_assert(sizeof(config.modem) == sizeof(int), "vesk_modem is an int");
+  int value;
+  std::memcpy(&value, &config.modem, sizeof value);
+  return value;
+}
+
 // Why `config`'s token layout cannot be used; empty when it can.
 std::string LayoutError(const vesk_config& config) {
-  if (config.modem != VESK_MODEM_DSSS && config.modem != VESK_MODEM_DTMF) {
+  const int modem = ModemValue(config);
+  if (modem != VESK_MODEM_DSSS && modem != VESK_MODEM_DTMF) {
     return "modem must be VESK_MODEM_DSSS or VESK_MODEM_DTMF";
   }
   if (config.crc_check_bytes != 0 && config.crc_check_bytes != 2) {
