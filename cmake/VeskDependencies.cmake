@@ -2,6 +2,12 @@
 # installed package (Debian's on a host build, the NDK's or a prefix given with
 # CMAKE_PREFIX_PATH on an Android build); nothing is vendored.
 
+# The WebAssembly build has dependencies of its own.
+if(EMSCRIPTEN)
+  include(VeskWasmDependencies)
+  return()
+endif()
+
 # kissfft, single-precision float build.
 find_package(kissfft CONFIG QUIET COMPONENTS SHARED float)
 if(TARGET kissfft::kissfft-float)

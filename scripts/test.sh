@@ -4,16 +4,21 @@
 #   i686     32-bit x86 (-m32 -march=i686 -mssse3 -mfpmath=sse), the stand-in
 #            for the Android x86 ABI: the C++ suites;
 #   sanitize x86-64 under AddressSanitizer and UndefinedBehaviorSanitizer:
-#            the C++ suites.
+#            the C++ suites;
 #   fuzz     every libFuzzer target (clang, ASan, UBSan) for 30 s from its
-#            seed corpus (scripts/fuzz.sh).
+#            seed corpus (scripts/fuzz.sh);
+#   web      the WebAssembly module in Node.js and the page in headless
+#            Chromium (scripts/test-web.sh); by default only where the web
+#            toolchain can be installed.
 # Installs missing packages first, only those the chosen builds need.
 # VESK_TEST_BUILDS="host i686" picks builds.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
 JOBS=${JOBS:-$(nproc)}
-BUILDS=${VESK_TEST_BUILDS:-host i686 sanitize fuzz}
+BUILDS=${VESK_TEST_BUILDS:-host i686 sanitize fuzz web}
+# The default builds run the web tests only where their toolchain installs.
+[ -n "${VESK_TEST_BUILDS:-}" ] || web_optional=--if-installable
 
 groups=(build test)
 for b in $BUILDS; do
@@ -43,6 +48,7 @@ for b in $BUILDS; do
     sanitize) configure_and_build sanitize -DVESK_SANITIZE=ON -DVESK_BUILD_JAVA=OFF \
                 -DVESK_BUILD_BENCHMARKS=OFF ;;
     fuzz) JOBS=$JOBS ./scripts/fuzz.sh 30; continue ;;
+    web) ./scripts/test-web.sh ${web_optional:-}; continue ;;
     *) echo "unknown build: $b" >&2; exit 2 ;;
   esac
   (cd "build/$b" && ctest --output-on-failure -j "$JOBS")

@@ -5,6 +5,7 @@
 
 #include "vesk/vesk.h"
 
+#include <algorithm>
 #include <cstdlib>
 #include <cstring>
 #include <exception>
@@ -15,6 +16,7 @@
 #include <vector>
 
 #include "audio/dsp/pcm_conversion.h"
+#include "audio/vesknet/dtmf/dtmf_encoder_params.h"
 #include "social/tandry/audio/audio_modem_encoder.h"
 #include "social/tandry/audio/config_limits.h"
 #include "social/tandry/audio/token_stream.h"
@@ -33,6 +35,7 @@ struct vesk_decoder {
   std::unique_ptr<audio_modem::TokenStream> stream;
   std::vector<audio_modem::StreamToken> taken;
   std::vector<vesk_token> records;
+  std::vector<int16_t> converted;  // Float input on its way to the stream.
 };
 
 namespace {
@@ -194,6 +197,19 @@ std::unique_ptr<audio_modem::TokenStream> MakeStream(const vesk_config& config,
   return audio_modem::TokenStream::Create(dtmf, config.crc_check_bytes, stream_options, error);
 }
 
+// The highest frequency that a transmitter of `config` puts out as a
+// carrier or tone, Hz; `config` has passed LayoutError.
+float HighestFrequency(const vesk_config& config) {
+  if (config.modem == VESK_MODEM_DSSS) return config.dsss.carrier_frequency_hz;
+  audio_modem::DtmfWaveformConfig waveform;
+  FillDtmfWaveform(config, &waveform);
+  // An empty tone set is the default set, which the encoder's record holds.
+  const std::vector<float> tones = waveform.tone_frequencies.empty()
+                                       ? audio_vesknet::DtmfEncoderParams().tone_frequencies
+                                       : waveform.tone_frequencies;
+  return *std::max_element(tones.begin(), tones.end());
+}
+
 // Encodes `message` into the encoder's scratch vectors.
 vesk_status EncodeToScratch(vesk_encoder* encoder, const uint8_t* message, size_t message_bytes) {
   if (message == nullptr) return Fail(VESK_ERROR_ARGUMENT, "message is NULL");
@@ -296,6 +312,27 @@ vesk_status vesk_config_defaults(vesk_config* config, int modem) {
   t.tone_frequencies_hz = nullptr;
   t.num_tones = 0;
   return Ok();
+}
+
+vesk_status vesk_config_min_microphone_rate(const vesk_config* config, float* rate_hz) {
+  return Guarded([&] {
+    if (config == nullptr) return Fail(VESK_ERROR_ARGUMENT, "config is NULL");
+    if (rate_hz == nullptr) return Fail(VESK_ERROR_ARGUMENT, "rate_hz is NULL");
+    std::string error = LayoutError(*config);
+    if (error.empty()) {
+      // The waveform's own checks; the decoder's options play no part.
+      if (config->modem == VESK_MODEM_DSSS) {
+        error = audio_modem::DsssWaveformConfigError(DsssWaveform(config->dsss));
+      } else {
+        audio_modem::DtmfWaveformConfig waveform;
+        FillDtmfWaveform(*config, &waveform);
+        error = audio_modem::DtmfWaveformConfigError(waveform);
+      }
+    }
+    if (!error.empty()) return Fail(VESK_ERROR_CONFIG, error);
+    *rate_hz = 2 * HighestFrequency(*config);
+    return Ok();
+  });
 }
 
 vesk_status vesk_decoder_options_defaults(vesk_decoder_options* options) {
@@ -413,6 +450,26 @@ vesk_status vesk_decoder_process(vesk_decoder* decoder, const int16_t* samples,
     if (decoder == nullptr) return Fail(VESK_ERROR_ARGUMENT, "decoder is NULL");
     if (samples == nullptr && num_samples > 0) return Fail(VESK_ERROR_ARGUMENT, "samples is NULL");
     decoder->stream->Feed(samples, num_samples);
+    return Ok();
+  });
+}
+
+vesk_status vesk_decoder_process_float(vesk_decoder* decoder, const float* samples,
+                                       size_t num_samples) {
+  return Guarded([&] {
+    if (decoder == nullptr) return Fail(VESK_ERROR_ARGUMENT, "decoder is NULL");
+    if (samples == nullptr && num_samples > 0) return Fail(VESK_ERROR_ARGUMENT, "samples is NULL");
+    // Pieces of one stream block at most: the buffer stays small whatever
+    // the caller hands in.
+    constexpr size_t kPiece = audio_modem::TokenStream::kPieceFrames;
+    for (size_t start = 0; start < num_samples; start += kPiece) {
+      const size_t n = std::min(kPiece, num_samples - start);
+      decoder->converted.resize(n);
+      for (size_t i = 0; i < n; ++i) {
+        decoder->converted[i] = audio_dsp::FloatToPcm16(samples[start + i]);
+      }
+      decoder->stream->Feed(decoder->converted.data(), n);
+    }
     return Ok();
   });
 }

@@ -147,6 +147,16 @@ typedef struct vesk_config {
    filled; only the modem's own is used). */
 VESK_API vesk_status vesk_config_defaults(vesk_config* config, int modem);
 
+/*
+ * The lowest microphone rate, Hz, that hears the transmitters of `config`:
+ * twice the DSSS carrier (the microphone then passes the whole band below
+ * the carrier, which carries a token on its own) or twice the highest DTMF
+ * tone. Decoders accept lower rates but hear nothing at them. Web Audio and
+ * similar hosts pick the rate themselves: compare it with this before
+ * listening. VESK_ERROR_CONFIG when `config` cannot be used.
+ */
+VESK_API vesk_status vesk_config_min_microphone_rate(const vesk_config* config, float* rate_hz);
+
 /* How a decoder listens. Fill it with vesk_decoder_options_defaults(). */
 typedef struct vesk_decoder_options {
   int microphone_rate_hz; /* >= 1000 (44100); the listening mode needs >= 36994. */
@@ -239,6 +249,17 @@ VESK_API void vesk_decoder_destroy(vesk_decoder* decoder);
  */
 VESK_API vesk_status vesk_decoder_process(vesk_decoder* decoder, const int16_t* samples,
                                           size_t num_samples);
+
+/*
+ * Feeds `num_samples` interleaved float samples in -1 ... 1, the range of Web
+ * Audio and most audio APIs: each becomes the 16-bit sample that the
+ * encoder would make of it (x 32768, truncated toward zero, clamped) and is
+ * fed as vesk_decoder_process() feeds it, so the two calls may be mixed.
+ * Converts in pieces through a buffer of the decoder's: no allocation per
+ * call.
+ */
+VESK_API vesk_status vesk_decoder_process_float(vesk_decoder* decoder, const float* samples,
+                                                size_t num_samples);
 
 /* Decodes the samples of an incomplete block now (at the end of a
    recording); a partial frame is dropped. */

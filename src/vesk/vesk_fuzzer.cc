@@ -1,11 +1,12 @@
 // Fuzz target: the C interface. Any configuration and options (read around
 // the edges that validation knows); what is accepted must encode the message
 // and decode hostile PCM cut into chunks of any size (frames split between
-// calls), with token, broadcaster, flush and wipe calls between. A status
+// calls) or as floats (non-finite ones included), with token, broadcaster, flush and wipe calls between. A status
 // other than VESK_OK after acceptance, a fatal check, a crash or a sanitizer
 // report is a finding.
 
 #include <cstdint>
+#include <limits>
 #include <vector>
 
 #include "base/fuzz_input.h"
@@ -47,7 +48,21 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   vesk_decoder* decoder = nullptr;
   if (vesk_decoder_create(&config, &options, &decoder) != VESK_OK) return 0;
   audio_modem::FuzzDecoderCalls calls;
+  std::vector<float> floats;
   calls.process = [&](const audio_modem::FuzzProcessCall& call) {
+    if (call.flags & 1) {
+      // Float input (Web Audio's), with out-of-range and non-finite values
+      // where the flags ask for them.
+      floats.assign(call.samples.begin(), call.samples.end());
+      for (size_t i = 0; i < floats.size(); ++i) {
+        floats[i] /= 32768.0f;
+        if ((call.flags & 2) && i % 97 == 0) floats[i] = std::numeric_limits<float>::quiet_NaN();
+        if ((call.flags & 4) && i % 89 == 0) floats[i] = -std::numeric_limits<float>::infinity();
+        if ((call.flags & 8) && i % 83 == 0) floats[i] = 3e9f;
+      }
+      Require(vesk_decoder_process_float(decoder, floats.data(), floats.size()) == VESK_OK);
+      return;
+    }
     // Two chunks, cut anywhere (frames split between calls).
     const int16_t* samples = call.samples.data();
     Require(vesk_decoder_process(decoder, samples, call.cut) == VESK_OK);

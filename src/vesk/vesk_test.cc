@@ -187,6 +187,86 @@ TEST(VeskCTest, ChunkSizesFromOneSampleToTenSecondsGiveTheSameTokens) {
   }
 }
 
+// Float samples in -1 ... 1 are the 16-bit samples / 32768: fed either
+// way, in any mix and any chunking, the decoder hears the same tokens at the
+// same times.
+TEST(VeskCTest, FloatInputIsTheSameStream) {
+  const vesk_config config = Defaults(VESK_MODEM_DTMF);
+  vesk_decoder_options options = Options(44100);
+  options.hold_seconds = 0;
+  const std::vector<int16_t> pcm = Broadcast(config, kFive);
+  const std::vector<Heard> reference = Decode(config, options, pcm, pcm.size());
+  ASSERT_GE(reference.size(), 3u);
+  std::vector<float> floats;
+  for (const int16_t s : pcm) floats.push_back(s / 32768.0f);
+  for (const size_t chunk : {size_t{1}, size_t{4095}, size_t{10000}, floats.size()}) {
+    vesk_decoder* decoder = nullptr;
+    ASSERT_EQ(vesk_decoder_create(&config, &options, &decoder), VESK_OK);
+    std::vector<Heard> heard;
+    for (size_t start = 0, call = 0; start < floats.size(); start += chunk, ++call) {
+      const size_t n = std::min(chunk, floats.size() - start);
+      // Every third call takes the 16-bit path.
+      ASSERT_EQ(call % 3 == 2 ? vesk_decoder_process(decoder, pcm.data() + start, n)
+                              : vesk_decoder_process_float(decoder, floats.data() + start, n),
+                VESK_OK);
+      const vesk_token* tokens = nullptr;
+      size_t count = 0;
+      ASSERT_EQ(vesk_decoder_take_tokens(decoder, &tokens, &count), VESK_OK);
+      for (size_t i = 0; i < count; ++i) {
+        heard.push_back(
+            {std::vector<uint8_t>(tokens[i].message, tokens[i].message + tokens[i].message_bytes),
+             tokens[i].time_seconds});
+      }
+    }
+    double seconds = 0;
+    ASSERT_EQ(vesk_decoder_stream_seconds(decoder, &seconds), VESK_OK);
+    EXPECT_EQ(seconds, pcm.size() / 44100.0) << "chunk " << chunk;
+    ASSERT_EQ(vesk_decoder_flush(decoder), VESK_OK);
+    const vesk_token* tokens = nullptr;
+    size_t count = 0;
+    ASSERT_EQ(vesk_decoder_take_tokens(decoder, &tokens, &count), VESK_OK);
+    for (size_t i = 0; i < count; ++i) {
+      heard.push_back(
+          {std::vector<uint8_t>(tokens[i].message, tokens[i].message + tokens[i].message_bytes),
+           tokens[i].time_seconds});
+    }
+    EXPECT_EQ(heard, reference) << "chunk " << chunk;
+    vesk_decoder_destroy(decoder);
+  }
+}
+
+TEST(VeskCTest, MinMicrophoneRateIsTwiceTheHighestCarrierOrTone) {
+  float rate = 0;
+  vesk_config dsss = Defaults(VESK_MODEM_DSSS);
+  ASSERT_EQ(vesk_config_min_microphone_rate(&dsss, &rate), VESK_OK);
+  EXPECT_EQ(rate, 37000.0f);
+  dsss.dsss.carrier_frequency_hz = 12000;
+  ASSERT_EQ(vesk_config_min_microphone_rate(&dsss, &rate), VESK_OK);
+  EXPECT_EQ(rate, 24000.0f);
+  // The default tone set tops out an octave above 1244.53 Hz.
+  vesk_config dtmf = Defaults(VESK_MODEM_DTMF);
+  ASSERT_EQ(vesk_config_min_microphone_rate(&dtmf, &rate), VESK_OK);
+  EXPECT_NEAR(rate, 4 * 1244.53f, 0.05f);
+  static const float kTones[] = {900, 3100, 1700};
+  dtmf.dtmf.tone_frequencies_hz = kTones;
+  dtmf.dtmf.num_tones = 3;
+  ASSERT_EQ(vesk_config_min_microphone_rate(&dtmf, &rate), VESK_OK);
+  EXPECT_EQ(rate, 6200.0f);
+  // A waveform that cannot be used has no rate; *rate_hz is left alone.
+  dtmf.dtmf.sustain_level = 2;
+  rate = -1;
+  EXPECT_EQ(vesk_config_min_microphone_rate(&dtmf, &rate), VESK_ERROR_CONFIG);
+  EXPECT_STREQ(vesk_last_error(), "the sustain amplitude must lie in [0, 1]");
+  dsss.dsss.bits_per_symbol = 3;
+  EXPECT_EQ(vesk_config_min_microphone_rate(&dsss, &rate), VESK_ERROR_CONFIG);
+  EXPECT_STREQ(vesk_last_error(), "bits per symbol must be 1, 2, 4 or 8");
+  dsss = Defaults(VESK_MODEM_DSSS);
+  dsss.crc_check_bytes = 1;
+  EXPECT_EQ(vesk_config_min_microphone_rate(&dsss, &rate), VESK_ERROR_CONFIG);
+  EXPECT_STREQ(vesk_last_error(), "crc_check_bytes must be 0 or 2");
+  EXPECT_EQ(rate, -1.0f);
+}
+
 // Every refusal is a status and a sentence; nothing aborts.
 TEST(VeskCTest, RefusedConfigurationsSayWhy) {
   using Edit = std::function<void(vesk_config*, vesk_decoder_options*)>;
@@ -307,6 +387,7 @@ TEST(VeskCTest, NullPointersAndWrongLengthsAreArgumentErrors) {
   vesk_pcm pcm;
   size_t size = 0;
   int16_t sample = 0;
+  float level = 0;
   const vesk_token* tokens = nullptr;
   int heard = 0;
   double seconds = 0;
@@ -329,6 +410,10 @@ TEST(VeskCTest, NullPointersAndWrongLengthsAreArgumentErrors) {
       [&] { return vesk_decoder_create(&config, nullptr, nullptr); },
       [&] { return vesk_decoder_process(nullptr, &sample, 1); },
       [&] { return vesk_decoder_process(decoder, nullptr, 1); },
+      [&] { return vesk_decoder_process_float(nullptr, &level, 1); },
+      [&] { return vesk_decoder_process_float(decoder, nullptr, 1); },
+      [&] { return vesk_config_min_microphone_rate(nullptr, &level); },
+      [&] { return vesk_config_min_microphone_rate(&config, nullptr); },
       [&] { return vesk_decoder_flush(nullptr); },
       [&] { return vesk_decoder_take_tokens(decoder, nullptr, &size); },
       [&] { return vesk_decoder_take_tokens(decoder, &tokens, nullptr); },
@@ -346,6 +431,7 @@ TEST(VeskCTest, NullPointersAndWrongLengthsAreArgumentErrors) {
   // Zero samples are no error, and nothing happens.
   EXPECT_EQ(vesk_decoder_process(decoder, nullptr, 0), VESK_OK);
   EXPECT_STREQ(vesk_last_error(), "");
+  EXPECT_EQ(vesk_decoder_process_float(decoder, nullptr, 0), VESK_OK);
   EXPECT_EQ(vesk_decoder_stream_seconds(decoder, &seconds), VESK_OK);
   EXPECT_EQ(seconds, 0.0);
   vesk_encoder_destroy(nullptr);
