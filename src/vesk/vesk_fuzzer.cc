@@ -1,9 +1,10 @@
 // Fuzz target: the C interface. Any configuration and options (read around
 // the edges that validation knows); what is accepted must encode the message
 // and decode hostile PCM cut into chunks of any size (frames split between
-// calls) or as floats (non-finite ones included), with token, broadcaster, flush and wipe calls between. A status
-// other than VESK_OK after acceptance, a fatal check, a crash or a sanitizer
-// report is a finding.
+// calls) or given as floats (non-finite ones included), with token,
+// broadcaster, flush and wipe calls between. A status other than VESK_OK
+// after acceptance, a fatal check, a crash or a sanitizer report is a
+// finding.
 
 #include <cstdint>
 #include <limits>
