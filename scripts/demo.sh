@@ -8,4 +8,4 @@ cd "$(dirname "$0")/.."
 cmake -S . -B build/demo -DVESK_BUILD_TESTS=OFF -DVESK_BUILD_BENCHMARKS=OFF \
   -DVESK_BUILD_JAVA=OFF > /dev/null
 cmake --build build/demo -j "$(nproc)" --target vesk
-exec build/demo/tools/vesk demo "$@"
+exec build/demo/tools/vesk/vesk demo "$@"

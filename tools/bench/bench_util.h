@@ -14,7 +14,6 @@
 #include <vector>
 
 #include "tools/bench/trial.h"
-#include "tools/vesk/option_parser.h"
 
 namespace vesk_bench {
 
@@ -60,27 +59,6 @@ inline double Median(std::vector<double> values) {
 // Whether the comma-separated `list` holds `item`.
 inline bool HasItem(const std::string& list, const char* item) {
   return ("," + list + ",").find(std::string(",") + item + ",") != std::string::npos;
-}
-
-// Parses the program's arguments into `parser`'s options (adding --help).
-// Returns -1 to go on, or the status to exit with (0 after the help, 2 after
-// an error, both printed).
-inline int ParseArguments(int argc, char** argv, const std::string& description,
-                          vesk_tool::OptionParser* parser) {
-  bool help = false;
-  parser->AddFlag("help", &help, "show this help");
-  std::string error;
-  const std::vector<std::string> args(argv + 1, argv + argc);
-  if (!parser->Parse(args, &error) || !parser->positional().empty()) {
-    std::fprintf(stderr, "%s: %s\n%s", argv[0],
-                 error.empty() ? "unexpected argument" : error.c_str(), parser->Help().c_str());
-    return 2;
-  }
-  if (help) {
-    std::printf("%s\n\n%s", description.c_str(), parser->Help().c_str());
-    return 0;
-  }
-  return -1;
 }
 
 // Applies each "name=value" of a comma-separated list with `apply`; false,

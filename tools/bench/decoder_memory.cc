@@ -16,7 +16,7 @@
 #include <vector>
 
 #include "social/tandry/audio/audio_modem_decoder.h"
-#include "tools/vesk/stream_decoding.h"
+#include "tools/common/stream_decoding.h"
 
 namespace {
 

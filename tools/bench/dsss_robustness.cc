@@ -6,10 +6,13 @@
 //
 //   dsss_robustness [--seeds N] [--threads N] [--coder 44k|48k|both]
 //       [--tables snr,speed,reverb,mic48,unchecked,false,tune,host]
-//       [--set name=value,...]   (--help lists every option)
+//       [--set name=value,...] [--csv FILE] [--snrs LIST] [--speeds LIST]
+//       [room options: --repeat, --snr, --speed, --reverb, --mic-rate, ...]
 //
-// --set overrides a decoder tuning field (see dsss_trial.cc), for measuring
-// the defaults themselves.
+// (--help lists every option.) The room options set the channel of every
+// table, each table then sets the variable it sweeps; --snr is the SNR of
+// the speed table. --set overrides a decoder tuning field (see
+// dsss_trial.cc), for measuring the defaults themselves.
 
 #include <algorithm>
 #include <atomic>
@@ -20,15 +23,16 @@
 #include <thread>
 #include <vector>
 
+#include "tools/bench/bench_options.h"
 #include "tools/bench/bench_util.h"
 #include "tools/bench/dsss_trial.h"
+#include "tools/bench/sweep_table.h"
 
 namespace vesk_bench {
 namespace {
 
 struct Options {
-  int seeds = 20;
-  int threads = 2;
+  BenchOptions bench;
   std::string tables = "snr,speed,reverb,mic48,unchecked,false";
   std::string coder = "both";
   double false_minutes = 10.0;
@@ -37,8 +41,18 @@ struct Options {
 };
 
 Point RunPoint(const DsssTrial& trial, const Options& options) {
-  return Summarize(ForSeeds(options.seeds, options.threads,
+  return Summarize(ForSeeds(options.bench.seeds, options.bench.threads,
                             [&](uint64_t seed) { return RunDsssTrial(trial, seed); }));
+}
+
+// A trial in the room of the options, before the table sets its variable.
+DsssTrial BaseTrial(const Options& options, const audio_modem::DsssWaveformConfig& waveform) {
+  DsssTrial trial;
+  trial.waveform = waveform;
+  trial.tuning = options.tuning;
+  trial.channel = options.bench.air.channel;
+  trial.repeat = options.bench.air.repeat;
+  return trial;
 }
 
 struct Coder {
@@ -53,31 +67,26 @@ std::vector<Coder> Coders(const Options& options) {
   return coders;
 }
 
-// One table: a row per value of the swept variable, two columns per coder.
+// One table: a row per value of the swept variable, a column group per coder.
 template <typename Setup>
-void Sweep(const char* title, const char* variable, const std::vector<double>& values,
-           const Options& options, Setup setup) {
+void Sweep(const char* table, const char* title, const char* variable,
+           const std::vector<double>& values, const Options& options, CsvFile* csv, Setup setup) {
   const std::vector<Coder> coders = Coders(options);
-  std::printf("\n### %s (%d seeds per point)\n\n| %s |", title, options.seeds, variable);
-  for (const Coder& c : coders) std::printf(" %s success | wrong | median delay s |", c.name);
-  std::printf("\n|---|");
-  for (size_t i = 0; i < coders.size(); ++i) std::printf("---|---|---|");
-  std::printf("\n");
-  for (double value : values) {
-    std::printf("| %g |", value);
-    for (const Coder& c : coders) {
-      DsssTrial trial;
-      trial.waveform = c.waveform;
-      trial.tuning = options.tuning;
-      trial.channel = DefaultTrialChannel();
-      setup(value, &trial);
-      const Point p = RunPoint(trial, options);
-      std::printf(" %5.1f%% | %d | %.2f |", 100.0 * p.successes / options.seeds, p.wrong,
-                  Median(p.delays));
-      std::fflush(stdout);
-    }
-    std::printf("\n");
-  }
+  SweepDescription sweep;
+  sweep.table = table;
+  sweep.title = title;
+  sweep.variable = variable;
+  for (const Coder& c : coders) sweep.series.push_back(c.name);
+  sweep.trials = options.bench.seeds;
+  sweep.repeat = options.bench.air.repeat;
+  RunSweep(
+      sweep, values,
+      [&](double value, size_t series) {
+        DsssTrial trial = BaseTrial(options, coders[series].waveform);
+        setup(value, &trial);
+        return RunPoint(trial, options);
+      },
+      csv);
 }
 
 void FalseTokens(const Options& options) {
@@ -93,10 +102,7 @@ void FalseTokens(const Options& options) {
       std::printf("| %s | %s |", babble ? "speech babble" : "white noise",
                   crc ? "CRC-16" : "none (8 raw bytes)");
       for (const Coder& c : coders) {
-        DsssTrial trial;
-        trial.waveform = c.waveform;
-        trial.tuning = options.tuning;
-        trial.channel = DefaultTrialChannel();
+        DsssTrial trial = BaseTrial(options, c.waveform);
         trial.crc = crc != 0;
         std::printf(" %d |", CountFalseTokens(trial, 60.0 * options.false_minutes, babble != 0,
                                               77 + babble));
@@ -135,10 +141,7 @@ void TuneRow(const Options& options, const std::string& label) {
   for (const Case& c : cases) {
     int successes = 0;
     for (const Coder& coder : Coders(options)) {
-      DsssTrial trial;
-      trial.waveform = coder.waveform;
-      trial.tuning = options.tuning;
-      trial.channel = DefaultTrialChannel();
+      DsssTrial trial = BaseTrial(options, coder.waveform);
       trial.channel.snr_db = c.snr;
       trial.channel.speed = c.speed;
       trial.channel.reverb = c.reverb;
@@ -151,10 +154,7 @@ void TuneRow(const Options& options, const std::string& label) {
   }
   int false_tokens = 0;
   for (const Coder& coder : Coders(options)) {
-    DsssTrial trial;
-    trial.waveform = coder.waveform;
-    trial.tuning = options.tuning;
-    trial.channel = DefaultTrialChannel();
+    DsssTrial trial = BaseTrial(options, coder.waveform);
     trial.crc = false;
     false_tokens += CountFalseTokens(trial, 180.0, false, 99);
   }
@@ -168,7 +168,7 @@ void HostTables(const Options& options) {
   std::printf(
       "\n### DetectBroadcaster: transmissions detected (of %d, both coders) and the "
       "share of positive answers in 3 minutes of noise\n\n",
-      2 * options.seeds);
+      2 * options.bench.seeds);
   std::printf(
       "| window s | threshold | detected at -15 dB | at -10 dB | median delay at -10 dB s "
       "| noise answers positive |\n|---|---|---|---|---|---|\n");
@@ -179,14 +179,11 @@ void HostTables(const Options& options) {
       for (double snr : {-15.0, -10.0}) {
         int detected = 0;
         for (const Coder& coder : Coders(options)) {
-          DsssTrial trial;
-          trial.waveform = coder.waveform;
-          trial.tuning = options.tuning;
+          DsssTrial trial = BaseTrial(options, coder.waveform);
           trial.tuning.acquisition_window_duration = window;
           trial.tuning.broadcaster_threshold = threshold;
-          trial.channel = DefaultTrialChannel();
           trial.channel.snr_db = snr;
-          for (int seed = 1; seed <= options.seeds; ++seed) {
+          for (int seed = 1; seed <= options.bench.seeds; ++seed) {
             const TrialResult r = RunDsssTrial(trial, seed);
             // Detected while the transmission lasts (about 2.2 s).
             if (r.heard_delay_s >= 0 && r.heard_delay_s < 2.5) {
@@ -199,12 +196,9 @@ void HostTables(const Options& options) {
       }
       double noise_share = 0, share = 0;
       for (const Coder& coder : Coders(options)) {
-        DsssTrial trial;
-        trial.waveform = coder.waveform;
-        trial.tuning = options.tuning;
+        DsssTrial trial = BaseTrial(options, coder.waveform);
         trial.tuning.acquisition_window_duration = window;
         trial.tuning.broadcaster_threshold = threshold;
-        trial.channel = DefaultTrialChannel();
         CountFalseTokens(trial, 180.0, false, 31, &share);
         noise_share += share / Coders(options).size();
       }
@@ -213,7 +207,7 @@ void HostTables(const Options& options) {
     }
   }
   std::printf("\n### History length (successes of %d, both coders)\n\n| buffer tokens |",
-              2 * options.seeds);
+              2 * options.bench.seeds);
   const double snrs[] = {-19, -18, -17, -15};
   for (double snr : snrs) std::printf(" %g dB |", snr);
   std::printf("\n|---|---|---|---|---|\n");
@@ -222,10 +216,7 @@ void HostTables(const Options& options) {
     for (double snr : snrs) {
       int successes = 0;
       for (const Coder& coder : Coders(options)) {
-        DsssTrial trial;
-        trial.waveform = coder.waveform;
-        trial.tuning = options.tuning;
-        trial.channel = DefaultTrialChannel();
+        DsssTrial trial = BaseTrial(options, coder.waveform);
         trial.channel.snr_db = snr;
         trial.buffer_length_tokens = tokens;
         successes += RunPoint(trial, options).successes;
@@ -241,22 +232,23 @@ void HostTables(const Options& options) {
 }  // namespace vesk_bench
 
 int main(int argc, char** argv) {
+  using vesk_bench::DsssTrial;
   vesk_bench::Options options;
-  options.threads = static_cast<int>(std::max(1u, std::thread::hardware_concurrency()));
+  options.bench.threads = static_cast<int>(std::max(1u, std::thread::hardware_concurrency()));
+  options.bench.air.channel = vesk_bench::DefaultTrialChannel();
+  options.bench.air.channel.snr_db = 10;  // Of the speed table.
   float false_minutes = static_cast<float>(options.false_minutes);
   std::string tuning;
   vesk_tool::OptionParser parser;
-  parser.AddInt("seeds", &options.seeds, "seeds per table cell");
-  parser.AddInt("threads", &options.threads, "trials run at once");
   parser.AddString("tables", &options.tables, "snr,speed,reverb,mic48,unchecked,false,tune,host");
-  parser.AddString("coder", &options.coder, "44k, 48k or both");
-  parser.AddFloat("false-minutes", &false_minutes, "minutes of noise and of babble");
+  parser.AddString("coder", &options.coder, "the coders measured").Choices({"44k", "48k", "both"});
+  parser.AddFloat("false-minutes", &false_minutes, "minutes of noise and of babble")
+      .Range(0.1, 1000);
   parser.AddString("set", &tuning, "decoder tuning overrides: name=value,name=value");
-  const int status = vesk_bench::ParseArguments(
-      argc, argv, "Robustness of the DSSS modem on the channel simulator.", &parser);
+  const int status = vesk_bench::ParseBenchArguments(
+      argc, argv, "Robustness of the DSSS modem on the channel simulator.", &parser,
+      &options.bench);
   if (status >= 0) return status;
-  options.seeds = std::max(1, options.seeds);
-  options.threads = std::max(1, options.threads);
   options.false_minutes = false_minutes;
   if (!vesk_bench::ApplyAssignments(tuning, [&](const std::string& assignment) {
         return vesk_bench::SetTuning(assignment, &options.tuning);
@@ -264,31 +256,45 @@ int main(int argc, char** argv) {
     return 2;
   }
   if (!tuning.empty()) options.label = tuning;
-  using vesk_bench::DsssTrial;
+  vesk_bench::CsvFile csv(options.bench.csv);
+  if (!csv.ok()) {
+    std::fprintf(stderr, "%s: cannot write %s\n", argv[0], options.bench.csv.c_str());
+    return 2;
+  }
+  const std::vector<double>& snrs = options.bench.snrs;
+  const double speed_snr_db = options.bench.air.channel.snr_db;
+  using vesk_bench::ValuesOr;
   if (vesk_bench::HasItem(options.tables, "snr")) {
-    std::vector<double> snrs;
-    for (int s = -20; s <= 10; ++s) snrs.push_back(s);
-    vesk_bench::Sweep("Success versus full-band SNR, token played 3 times, 44.1 kHz mic", "SNR dB",
-                      snrs, options, [](double v, DsssTrial* t) { t->channel.snr_db = v; });
+    std::vector<double> all;
+    for (int s = -20; s <= 10; ++s) all.push_back(s);
+    vesk_bench::Sweep("snr", "Success versus full-band SNR", "SNR dB", ValuesOr(snrs, all), options,
+                      &csv, [](double v, DsssTrial* t) { t->channel.snr_db = v; });
   }
   if (vesk_bench::HasItem(options.tables, "speed")) {
-    vesk_bench::Sweep("Success versus speed (clock skew or Doppler) at 10 dB SNR", "speed",
-                      {0.997, 0.998, 0.999, 1.0, 1.001, 1.002, 1.003}, options,
-                      [](double v, DsssTrial* t) {
-                        t->channel.speed = v;
-                        t->channel.snr_db = 10;
-                      });
+    const std::string title = "Success versus speed (clock skew or Doppler) at " +
+                              vesk_tool::FormatNumber(speed_snr_db) + " dB SNR";
+    vesk_bench::Sweep(
+        "speed", title.c_str(), "speed",
+        ValuesOr(options.bench.speeds, {0.997, 0.998, 0.999, 1.0, 1.001, 1.002, 1.003}), options,
+        &csv, [speed_snr_db](double v, DsssTrial* t) {
+          t->channel.speed = v;
+          t->channel.snr_db = speed_snr_db;
+        });
   }
   if (vesk_bench::HasItem(options.tables, "reverb")) {
-    vesk_bench::Sweep("Success with reverberation (RT60 0.3 s, D/R 3 dB)", "SNR dB",
-                      {10, 0, -5, -10, -12, -15}, options, [](double v, DsssTrial* t) {
+    const std::string title = "Success with reverberation (RT60 " +
+                              vesk_tool::FormatNumber(options.bench.air.channel.rt60_s) +
+                              " s, D/R 3 dB)";
+    vesk_bench::Sweep("reverb", title.c_str(), "SNR dB", ValuesOr(snrs, {10, 0, -5, -10, -12, -15}),
+                      options, &csv, [](double v, DsssTrial* t) {
                         t->channel.snr_db = v;
                         t->channel.reverb = true;
                       });
   }
   if (vesk_bench::HasItem(options.tables, "mic48")) {
-    vesk_bench::Sweep("Success with a 48 kHz microphone", "SNR dB", {10, 0, -5, -10, -15, -17},
-                      options, [](double v, DsssTrial* t) {
+    vesk_bench::Sweep("mic48", "Success with a 48 kHz microphone", "SNR dB",
+                      ValuesOr(snrs, {10, 0, -5, -10, -15, -17}), options, &csv,
+                      [](double v, DsssTrial* t) {
                         t->channel.snr_db = v;
                         t->channel.mic_rate = 48000;
                       });
@@ -296,14 +302,14 @@ int main(int argc, char** argv) {
   if (vesk_bench::HasItem(options.tables, "unchecked")) {
     // What the CRC buys: without a check a token heard only in part, or
     // under noise, also comes out wrong.
-    vesk_bench::Sweep("Without CRC: 8 unchecked bytes, one token per call", "SNR dB",
-                      {10, 0, -10, -15}, options, [](double v, DsssTrial* t) {
+    vesk_bench::Sweep("unchecked", "Without CRC: 8 unchecked bytes, one token per call", "SNR dB",
+                      ValuesOr(snrs, {10, 0, -10, -15}), options, &csv, [](double v, DsssTrial* t) {
                         t->channel.snr_db = v;
                         t->crc = false;
                         t->tuning.max_candidates_to_return = 1;
                       });
-    vesk_bench::Sweep("Without CRC, with the checksum symbol", "SNR dB", {10, 0, -10, -15}, options,
-                      [](double v, DsssTrial* t) {
+    vesk_bench::Sweep("unchecked_checksum", "Without CRC, with the checksum symbol", "SNR dB",
+                      ValuesOr(snrs, {10, 0, -10, -15}), options, &csv, [](double v, DsssTrial* t) {
                         t->channel.snr_db = v;
                         t->crc = false;
                         t->checksum_symbol = true;

@@ -38,14 +38,16 @@ TrialResult RunDsssTrial(const DsssTrial& trial, uint64_t seed) {
   encoder_config.waveform = trial.waveform;
   encoder_config.append_checksum_symbol = trial.checksum_symbol;
   const auto encoder = audio_modem::MakeDsssAudioModemEncoder(encoder_config);
-  std::vector<float> token, played;
-  encoder->Encode(message, &token, trial.crc ? 2 : 0);
-  encoder->MakeStartTransition(token, &played);
-  for (int r = 0; r < trial.repeat; ++r) played.insert(played.end(), token.begin(), token.end());
-  return DecodeOverTheAir(
-      played, encoder->GetSampleRate(), message, trial.crc ? 2 : 0, trial.channel, seed,
-      [&](int rate, int channels) { return MakeDecoder(trial, rate, channels); },
-      StreamOptions(trial));
+  vesk_tool::OverTheAir air;
+  air.repeat = trial.repeat;
+  air.channel = trial.channel;
+  air.channel.seed = seed;
+  return vesk_tool::Judge(
+      vesk_tool::SendOverTheAir(
+          *encoder, message, trial.crc ? 2 : 0, air,
+          [&](int rate, int channels) { return MakeDecoder(trial, rate, channels); },
+          StreamOptions(trial)),
+      message);
 }
 
 int CountFalseTokens(const DsssTrial& trial, double seconds, bool babble, uint64_t seed,

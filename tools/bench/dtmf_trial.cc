@@ -9,7 +9,7 @@
 #include "audio/vesknet/dtmf/dtmf_encoder.h"
 #include "base/logging.h"
 #include "social/tandry/audio/audio_modem_encoder.h"
-#include "tools/vesk/stream_decoding.h"
+#include "tools/common/stream_decoding.h"
 
 namespace vesk_bench {
 namespace {
@@ -48,13 +48,16 @@ int MessageBytes(const DtmfTrial& trial) {
 TrialResult RunDtmfTrial(const DtmfTrial& trial, uint64_t seed) {
   const std::vector<uint8_t> message = RandomMessage(MessageBytes(trial), seed);
   const auto encoder = MakeEncoder(trial);
-  std::vector<float> token, played;
-  encoder->Encode(message, &token, trial.crc ? 2 : 0);
-  for (int r = 0; r < trial.repeat; ++r) played.insert(played.end(), token.begin(), token.end());
-  return DecodeOverTheAir(
-      played, encoder->GetSampleRate(), message, trial.crc ? 2 : 0, trial.channel, seed,
-      [&](int rate, int channels) { return MakeDecoder(trial, rate, channels); },
-      vesk_tool::StreamDecodingOptions());
+  vesk_tool::OverTheAir air;
+  air.repeat = trial.repeat;
+  air.channel = trial.channel;
+  air.channel.seed = seed;
+  return vesk_tool::Judge(
+      vesk_tool::SendOverTheAir(
+          *encoder, message, trial.crc ? 2 : 0, air,
+          [&](int rate, int channels) { return MakeDecoder(trial, rate, channels); },
+          vesk_tool::StreamDecodingOptions()),
+      message);
 }
 
 int CountDtmfFalseTokens(const DtmfTrial& trial, double seconds, bool babble, uint64_t seed) {

@@ -22,34 +22,6 @@ std::vector<uint8_t> RandomMessage(size_t bytes, uint64_t seed) {
   return message;
 }
 
-TrialResult DecodeOverTheAir(const std::vector<float>& played, float rate,
-                             const std::vector<uint8_t>& message, int crc_bytes,
-                             vesk_channel::ChannelParams channel, uint64_t seed,
-                             const DecoderFactory& make_decoder,
-                             const vesk_tool::StreamDecodingOptions& options) {
-  channel.seed = seed;
-  const vesk_channel::ChannelOutput heard = vesk_channel::PlayThroughChannel(played, rate, channel);
-  const auto decoder = make_decoder(heard.rate, heard.channels);
-  vesk_tool::StreamDecoder stream(decoder.get(), heard.rate, heard.channels,
-                                  static_cast<int>(message.size()), crc_bytes, options);
-  const std::vector<vesk_tool::FoundToken> found =
-      stream.Feed(heard.samples.data(), static_cast<int64_t>(heard.samples.size()));
-  TrialResult result;
-  const double start_s = heard.signal_start_exact / heard.rate;
-  for (const vesk_tool::FoundToken& token : found) {
-    if (token.bytes == message) {
-      if (!result.correct) result.found_delay_s = token.time_s - start_s;
-      result.correct = true;
-    } else {
-      ++result.wrong;
-    }
-  }
-  if (stream.broadcaster_time_s() >= 0) {
-    result.heard_delay_s = stream.broadcaster_time_s() - start_s;
-  }
-  return result;
-}
-
 int CountFalseTokens(audio_modem::AudioModemDecoder* decoder, int rate, int message_bytes,
                      int crc_bytes, double seconds, bool babble, uint64_t seed,
                      const vesk_tool::StreamDecodingOptions& options, double* detections) {

@@ -9,7 +9,8 @@
 #include "social/tandry/audio/audio_modem_decoder.h"
 #include "social/tandry/audio/audio_modem_encoder.h"
 #include "tools/channel/channel_simulator.h"
-#include "tools/vesk/stream_decoding.h"
+#include "tools/common/over_the_air.h"
+#include "tools/common/stream_decoding.h"
 
 namespace {
 
@@ -22,31 +23,31 @@ struct Heard {
 
 // Plays 3 message bytes + 2 CRC bytes `repeat` times through `channel` and
 // decodes them with a receiver of the same waveform.
-Heard Loopback(const DtmfDecoderConfig& config, vesk_channel::ChannelParams channel,
+Heard Loopback(const DtmfDecoderConfig& config, const vesk_channel::ChannelParams& channel,
                int chunk_bytes, int repeat = 3) {
   audio_modem::DtmfEncoderConfig encoder_config;
   static_cast<audio_modem::DtmfWaveformConfig&>(encoder_config) = config;
   const auto encoder = audio_modem::MakeDtmfAudioModemEncoder(encoder_config);
   const std::vector<uint8_t> message = {static_cast<uint8_t>(channel.seed * 37), 0xA5, 0x0F};
-  std::vector<float> token, played;
-  encoder->Encode(message, &token, 2);
-  for (int r = 0; r < repeat; ++r) played.insert(played.end(), token.begin(), token.end());
-  channel.lead_in_s = 0.3;
-  channel.max_random_lead_in_s = 0.5;
-  channel.tail_s = 0.5;
-  const vesk_channel::ChannelOutput heard =
-      vesk_channel::PlayThroughChannel(played, encoder->GetSampleRate(), channel);
-
-  DtmfDecoderConfig receiver = config;
-  receiver.input_sample_rate = static_cast<float>(heard.rate);
-  receiver.num_channels = heard.channels;
-  const auto decoder = audio_modem::MakeDtmfAudioModemDecoder(receiver);
+  vesk_tool::OverTheAir air;
+  air.repeat = repeat;
+  air.channel = channel;
+  air.channel.lead_in_s = 0.3;
+  air.channel.max_random_lead_in_s = 0.5;
+  air.channel.tail_s = 0.5;
   vesk_tool::StreamDecodingOptions options;
   options.chunk_bytes = chunk_bytes;
-  vesk_tool::StreamDecoder stream(decoder.get(), heard.rate, heard.channels, 3, 2, options);
+  const vesk_tool::Reception reception = vesk_tool::SendOverTheAir(
+      *encoder, message, 2, air,
+      [&](int rate, int channels) {
+        DtmfDecoderConfig receiver = config;
+        receiver.input_sample_rate = static_cast<float>(rate);
+        receiver.num_channels = channels;
+        return audio_modem::MakeDtmfAudioModemDecoder(receiver);
+      },
+      options);
   Heard result;
-  for (const vesk_tool::FoundToken& found :
-       stream.Feed(heard.samples.data(), static_cast<int64_t>(heard.samples.size()))) {
+  for (const vesk_tool::FoundToken& found : reception.found) {
     (found.bytes == message ? result.correct : result.wrong) += 1;
   }
   return result;

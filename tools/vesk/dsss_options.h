@@ -1,4 +1,4 @@
-// The DSSS options shared by the vesk commands.
+// The DSSS options shared by the vesk commands: token layout and waveform.
 
 #ifndef TOOLS_VESK_DSSS_OPTIONS_H_
 #define TOOLS_VESK_DSSS_OPTIONS_H_
@@ -6,7 +6,7 @@
 #include <string>
 
 #include "social/tandry/audio/dsss_waveform_config.h"
-#include "tools/vesk/option_parser.h"
+#include "tools/common/option_parser.h"
 
 namespace vesk_tool {
 
@@ -19,12 +19,22 @@ struct DsssOptions {
 };
 
 // Registers --preset, --crc, --checksum-symbol, --taps, --code, --coder-rate,
-// --upsampling, --decimation, --carrier, --bits, --cycles and --quadrature.
+// --upsampling, --decimation, --carrier, --bits, --cycles and --quadrature,
+// each with its range.
 void AddDsssOptions(OptionParser* parser, DsssOptions* options);
 
 // After parsing: applies the preset to the coder fields that the user did
-// not set and validates the waveform. Returns an empty string or what is wrong.
+// not set, then checks what single ranges cannot (the code number for the
+// register length, the decimation against the upsampling, the carrier
+// against the coder rate, the symbol tones against the baseband frame).
+// Returns an empty string, or a message naming the options and values.
 std::string FinishDsssOptions(const OptionParser& parser, DsssOptions* options);
+
+// The carrier must lie below half of `rate` (the broadcast or the input
+// rate, named `what` in the message "--broadcast-rate 8000"). Empty or the
+// reason.
+std::string CheckCarrierBelowNyquist(const audio_modem::DsssWaveformConfig& waveform, int rate,
+                                     const std::string& what);
 
 }  // namespace vesk_tool
 

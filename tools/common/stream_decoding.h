@@ -2,8 +2,8 @@
 // asking for tokens at a fixed interval, and reports each token once, when
 // first found.
 
-#ifndef TOOLS_VESK_STREAM_DECODING_H_
-#define TOOLS_VESK_STREAM_DECODING_H_
+#ifndef TOOLS_COMMON_STREAM_DECODING_H_
+#define TOOLS_COMMON_STREAM_DECODING_H_
 
 #include <cstdint>
 #include <vector>
@@ -35,6 +35,17 @@ class StreamDecoder {
   // during this call.
   std::vector<FoundToken> Feed(const int16_t* samples, int64_t count);
 
+  // Ends the stream: the decoder needs about 0.09 s of audio after a token
+  // before it can report it, so a token that ends with the input would be
+  // lost. Feeds kFlushSeconds of silence, asks once more and returns the
+  // tokens first found, timed at the end of the input; time_s() stays the
+  // input's length. Feed no more afterwards.
+  std::vector<FoundToken> Finish();
+
+  // Silence fed by Finish(): the measured 0.09 s need (both DSSS coders,
+  // with and without the listening mode) with margin, and one request interval.
+  static constexpr double kFlushSeconds = 0.25;
+
   // Seconds of audio fed so far.
   double time_s() const { return static_cast<double>(frames_fed_) / rate_; }
   // Stream time of the first positive DetectBroadcaster answer, or -1.
@@ -64,4 +75,4 @@ class StreamDecoder {
 
 }  // namespace vesk_tool
 
-#endif  // TOOLS_VESK_STREAM_DECODING_H_
+#endif  // TOOLS_COMMON_STREAM_DECODING_H_

@@ -1,4 +1,4 @@
-#include "tools/vesk/stream_decoding.h"
+#include "tools/common/stream_decoding.h"
 
 #include <algorithm>
 
@@ -35,6 +35,17 @@ std::vector<FoundToken> StreamDecoder::Feed(const int16_t* samples, int64_t coun
       next_request_frame_ += static_cast<int64_t>(options_.request_interval_s * rate_);
     }
   }
+  return found;
+}
+
+std::vector<FoundToken> StreamDecoder::Finish() {
+  const int64_t input_frames = frames_fed_;
+  const std::vector<int16_t> silence(
+      static_cast<size_t>(kFlushSeconds * rate_) * static_cast<size_t>(channels_), 0);
+  std::vector<FoundToken> found = Feed(silence.data(), static_cast<int64_t>(silence.size()));
+  Request(&found);
+  frames_fed_ = input_frames;
+  for (FoundToken& token : found) token.time_s = time_s();
   return found;
 }
 
