@@ -2,7 +2,8 @@
 // product configurations of each modem, encoded tokens fed through the
 // decoders in recording-sized pieces. Run by scripts/make-fuzz-corpus.sh.
 //
-// Usage: make_fuzz_corpus <repository root>
+// Usage: make_fuzz_corpus <repository root>  (run from the root: the seeds of
+// the tools' targets go under tools/, the others under src/)
 
 #include <cstdint>
 #include <fstream>
@@ -15,6 +16,7 @@
 #include "location/pellam/cpp/audio/jni/jni_fuzz_header.h"
 #include "social/tandry/audio/audio_modem_encoder.h"
 #include "social/tandry/audio/fuzz_modem_config.h"
+#include "tools/common/audio_output.h"
 
 namespace {
 
@@ -118,6 +120,60 @@ int main(int argc, char** argv) {
     audio_modem::WriteFuzzDecoderCalls(Heard(at_jni_rate), header.channels, 4096, &jni);
     ok &= Save(src + "location/pellam/cpp/audio/jni/jni_fuzzer_corpus/" + s.name, jni);
     ++kind;
+  }
+
+  // The audio reader: the options byte (bit 0-1 how headerless input is
+  // taken, bit 2 8 kHz, bits 3 on channels - 1), then a DTMF token as a
+  // 16-bit stereo WAV, a float WAV, and raw PCM.
+  const std::vector<int16_t> dtmf = Heard(FuzzModemConfig::Dtmf());
+  std::vector<int16_t> stereo;
+  for (size_t i = 0; i < dtmf.size() / 4; ++i) stereo.insert(stereo.end(), {dtmf[i], dtmf[i]});
+  std::vector<float> floats(dtmf.begin(), dtmf.begin() + dtmf.size() / 4);
+  for (float& f : floats) f /= 32768.0f;
+  const std::string reader = std::string(argv[1]) + "/tools/common/audio_input_fuzzer_corpus/";
+  const struct {
+    const char* name;
+    uint8_t options;
+    std::vector<uint8_t> bytes;
+  } inputs[] = {
+      {"wav16_stereo", 1, vesk_tool::WavBytes(stereo, 44100, 2)},
+      {"wav_float", 1, vesk_tool::WavBytes(floats, 44100, 1)},
+      {"raw", 2, std::vector<uint8_t>(reinterpret_cast<const uint8_t*>(dtmf.data()),
+                                      reinterpret_cast<const uint8_t*>(dtmf.data()) +
+                                          dtmf.size() / 2)},
+  };
+  for (const auto& input : inputs) {
+    base::FuzzSeed seed;
+    seed.Byte(input.options);
+    for (const uint8_t byte : input.bytes) seed.Byte(byte);
+    ok &= Save(reader + input.name, seed);
+  }
+
+  // The tool's options: a command byte (0 encode, 1 decode, 2 demo) and the
+  // arguments, each ended by a zero byte; command lines from the README.
+  const std::string options = std::string(argv[1]) + "/tools/vesk/options_fuzzer_corpus/";
+  const struct {
+    const char* name;
+    uint8_t command;
+    std::vector<std::string> args;
+  } lines[] = {
+      {"encode", 0, {"token.wav", "--message", "0123456789ab", "--repeat", "3"}},
+      {"encode_dtmf_raw", 0, {"-", "--dtmf", "--raw", "--message", "0102030405"}},
+      {"encode_44k", 0, {"-", "--preset", "44k", "--broadcast-rate", "48000"}},
+      {"decode_raw", 1, {"-", "--raw", "--rate", "44100"}},
+      {"decode_dtmf_json", 1, {"dtmf.wav", "--dtmf", "--json"}},
+      {"decode_zintar", 1, {"-", "--zintar", "--rate", "48000", "--channels", "2"}},
+      {"demo", 2, {"--snr", "-10", "--speed", "1.002"}},
+      {"demo_dtmf", 2, {"--dtmf", "--snr", "-10"}},
+  };
+  for (const auto& line : lines) {
+    base::FuzzSeed seed;
+    seed.Byte(line.command);
+    for (size_t i = 0; i < line.args.size(); ++i) {
+      if (i > 0) seed.Byte(0);
+      for (const char c : line.args[i]) seed.Byte(static_cast<uint8_t>(c));
+    }
+    ok &= Save(options + line.name, seed);
   }
   return ok ? 0 : 1;
 }
