@@ -11,7 +11,16 @@
 // stages); the output stream runs D positions behind the input, D being the
 // smoother's group delay, and output i always belongs to position i.
 //
-// Not thread-safe. Allocates at construction and when inputs grow.
+// Cost: per position, one pass over the frame (F multiply-adds per part) for
+// eight positions at a time, their chunk correlations held in four-lane
+// vectors whose lanes are positions, and one pass over the chunks per pair of
+// opposite shifts (a shift and its mirror share their products); the
+// broadcaster score keeps its frame-integrated energies up to date as
+// positions arrive, so a request reads one value per lag.
+//
+// Not thread-safe. Allocates at construction and when an input block is
+// larger than every earlier one; otherwise ComputeScores does not allocate
+// (the output vector keeps its capacity).
 
 #ifndef AUDIO_VESKNET_ACQUISITION_SCORER_H_
 #define AUDIO_VESKNET_ACQUISITION_SCORER_H_
@@ -39,16 +48,22 @@ class AcquisitionScorer {
 
   // Takes in newly arrived baseband samples (equal lengths) and replaces
   // *acquisition_scores with one score per newly completed output position.
+  // The scores do not depend on how the stream is cut into blocks.
   void ComputeScores(const std::vector<float>& baseband_real_signal,
                      const std::vector<float>& baseband_imaginary_signal,
                      std::vector<float>* acquisition_scores);
+  // The same for `count` samples of each part.
+  void ComputeScores(const float* baseband_real_signal, const float* baseband_imaginary_signal,
+                     int count, std::vector<float>* acquisition_scores);
 
   // How clearly a code frame repeats with the frame period over the last
   // detection window: the largest frame-integrated shift energy, normalised
   // (when asked) by the average. 0 until a whole window has been scored.
   float GetBroadcasterScore(bool normalize) const;
 
-  // The S shift energies of one frame of exactly F samples.
+  // The S shift energies of one frame of exactly F samples, computed directly
+  // (chunk by chunk, then shift by shift): the definition that the streaming
+  // scores follow within float rounding.
   void ScoreFrame(const std::vector<float>& baseband_frame_real,
                   const std::vector<float>& baseband_frame_imaginary,
                   std::vector<float>* shift_scores) const;
@@ -63,10 +78,33 @@ class AcquisitionScorer {
   int64_t positions_scored() const { return positions_scored_; }
 
  private:
-  // Shift energies of the frame at real[0 .. F), imag[0 .. F).
+  // Positions scored together, one per vector lane (two four-lane vectors).
+  static constexpr int kLanes = 8;
+
+  // A Doppler shift, and the shift whose phasors are its exact conjugates
+  // (-1 when the list has none): the two energies come from the same four
+  // chunk-phasor products.
+  struct ShiftTerm {
+    int shift;
+    int mirror;
+  };
+
+  // Shift energies of the frame at real[0 .. F), imag[0 .. F), directly.
   void ScorePointers(const float* real, const float* imag, float* shift_scores) const;
-  // Scores the position at the readers' read position and emits its output.
-  void ScorePosition(std::vector<float>* acquisition_scores);
+  // Shift energies of the `count` (<= kLanes) positions starting at `real`
+  // and `imag` into the history, for the positions from positions_scored_
+  // on. Reads kLanes - 1 + F samples of each part whatever the count.
+  void ScoreBlock(const float* real, const float* imag, int count);
+  // Bookkeeping of the next position, whose energies are in the history:
+  // background, output, frame-integrated energies; counts the position.
+  void FinishPosition(std::vector<float>* acquisition_scores);
+  // The S energies of `position` in the history.
+  float* Energies(int64_t position) {
+    return energies_.data() + (position & energies_mask_) * num_shifts_;
+  }
+  const float* Energies(int64_t position) const {
+    return energies_.data() + (position & energies_mask_) * num_shifts_;
+  }
 
   int frame_size_;
   int num_shifts_;
@@ -76,6 +114,7 @@ class AcquisitionScorer {
   // Phasor of shift s at chunk k: (phasor_real_, phasor_imag_)[s * C + k].
   std::vector<float> phasor_real_;
   std::vector<float> phasor_imag_;
+  std::vector<ShiftTerm> terms_;
   int detection_span_;
   int detection_num_frames_;
   int detection_num_shifts_;
@@ -84,15 +123,36 @@ class AcquisitionScorer {
   int warm_up_;
 
   // Streaming state.
+  // Samples not yet consumed, [0, buffered_), followed by kLanes - 1 zeros
+  // that a last, partial block reads.
   std::vector<float> reader_real_;
   std::vector<float> reader_imag_;
-  int read_position_ = 0;
+  int buffered_ = 0;
   double noise_state1_ = 0.0;
   double noise_state2_ = 0.0;
-  CircularArray<std::vector<float>> history_;
+  // Shift energies of the positions held, S per position, ring-indexed by
+  // position AND energies_mask_ (the capacity covers the detection span).
+  std::vector<float> energies_;
+  int64_t energies_mask_;
+  // Each position's largest energy, for its output D positions later.
+  CircularArray<float> best_energy_;
+  // Frame-integrated energies: for position t and shift s, the sum of the
+  // energies at t, t - F, ... (detection_num_frames_ of them), updated from
+  // those of t - F; held for the last F positions at (t mod F) * S.
+  std::vector<double> frame_sums_;
+  int frame_phase_ = 0;       // Next position mod F.
+  int frame_count_ = 0;       // Next position's frame number mod detection_num_frames_.
+  std::vector<float> zeros_;  // S zeros: the energies before the first position.
+  // Their largest value and their total, per position, for the last
+  // detection_num_shifts_ positions.
+  CircularArray<double> frame_sum_max_;
+  CircularArray<double> frame_sum_total_;
   int64_t positions_scored_ = 0;
-  mutable std::vector<float> chunk_real_;
-  mutable std::vector<float> chunk_imag_;
+  // Per-block scratch: chunk correlations (C x kLanes, lanes innermost) and
+  // energies (S x kLanes).
+  std::vector<float> chunk_real_;
+  std::vector<float> chunk_imag_;
+  std::vector<float> block_energies_;
 };
 
 }  // namespace audio_vesknet
