@@ -4,7 +4,7 @@
 #include <cmath>
 #include <complex>
 
-#include "audio/dsp/float4.h"
+#include "audio/dsp/simd.h"
 #include "audio/dsp/matrix.h"
 #include "audio/dsp/number_util.h"
 #include "audio/vesknet/vesknet_util.h"
