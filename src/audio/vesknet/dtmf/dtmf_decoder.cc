@@ -8,7 +8,7 @@
 
 #include "audio/dsp/max_filter.h"
 #include "audio/dsp/resampling_kernel.h"
-#include "audio/vesknet/compute_buffer_truncation.h"
+#include "audio/vesknet/stream_intake.h"
 #include "base/logging.h"
 
 // Some checks compare a vector's size with an int, as their texts read.
@@ -70,10 +70,6 @@ int64_t RoundToFrameCount(double value) {
   const double rounded = std::round(value);
   if (!(rounded > 0.0)) return 0;
   return static_cast<int64_t>(std::min<double>(rounded, std::numeric_limits<int32_t>::max()));
-}
-
-int32_t ClampToInt32(int64_t value) {
-  return static_cast<int32_t>(std::min<int64_t>(value, std::numeric_limits<int32_t>::max()));
 }
 
 }  // namespace
@@ -153,38 +149,28 @@ void DtmfDecoder::ProcessSamples(const std::vector<float>& received_samples) {
     return;
   }
   if (received_samples.empty()) return;
+  const int64_t count = static_cast<int64_t>(received_samples.size());
+  const int64_t first = AdmitBlock(
+      count, num_channels_, token_length_, max_buffer_size_,
+      [this] { return buffered_received_samples(); },
+      [this] { Init(received_sample_rate_, num_channels_); },
+      [this](int frames) { DropHistory(frames); });
+  if (first == count) return;
 
-  const int64_t input_frames = static_cast<int64_t>(received_samples.size()) / num_channels_;
-  int32_t samples_to_skip = 0;
-  int32_t samples_to_drop = 0;
-  ComputeBufferTruncation(ClampToInt32(input_frames), ClampToInt32(buffered_received_samples()),
-                          ClampToInt32(token_length_), ClampToInt32(max_buffer_size_),
-                          &samples_to_skip, &samples_to_drop);
-  const int64_t skipped_values = static_cast<int64_t>(samples_to_skip) * num_channels_;
-  if (skipped_values >= 1) {
-    // The block alone overruns the buffer: start afresh on its tail.
-    Init(received_sample_rate_, num_channels_);
-    ProcessSamples(
-        std::vector<float>(received_samples.begin() + skipped_values, received_samples.end()));
-    return;
-  }
-  if (samples_to_drop > 0) DropHistory(samples_to_drop);
-
+  const float* samples = received_samples.data() + first;
   if (num_channels_ == 1) {
-    FeedMono(received_samples);
+    if (first == 0) {
+      FeedMono(received_samples);
+    } else {
+      mono_.assign(samples, received_samples.data() + count);
+      FeedMono(mono_);
+    }
     return;
   }
   CHECK(received_samples.size() % num_channels_ == 0);
-  const int frames = static_cast<int>(input_frames);
-  const float scale = 1.0f / static_cast<float>(num_channels_);
-  mono_.resize(frames);
-  const float* interleaved = received_samples.data();
-  for (int i = 0; i < frames; ++i) {
-    float sum = 0.0f;
-    for (int c = 0; c < num_channels_; ++c) sum += interleaved[c];
-    mono_[i] = sum * scale;
-    interleaved += num_channels_;
-  }
+  // The mean of the channels.
+  DownmixChannels(samples, static_cast<int>((count - first) / num_channels_), num_channels_,
+                  1.0f / static_cast<float>(num_channels_), &mono_);
   FeedMono(mono_);
 }
 
