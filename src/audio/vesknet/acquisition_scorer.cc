@@ -4,9 +4,9 @@
 #include <cmath>
 #include <complex>
 
-#include "audio/dsp/simd.h"
 #include "audio/dsp/matrix.h"
 #include "audio/dsp/number_util.h"
+#include "audio/dsp/simd.h"
 #include "audio/vesknet/vesknet_util.h"
 #include "base/logging.h"
 
@@ -29,13 +29,12 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
       num_shifts_(static_cast<int>(doppler_shifts.size())),
       num_chunks_(num_chunks),
       reference_(reference),
-      best_energy_(1),
-      frame_sum_max_(1),
-      frame_sum_total_(1) {
+      best_energy_(1) {
   CHECK(num_chunks_ > 0);
   CHECK(frame_size_ > 0);
   CHECK(num_shifts_ > 0);
   chunk_length_ = (frame_size_ + num_chunks_ - 1) / num_chunks_;
+  row_stride_ = (num_shifts_ + 15) / 16 * 16;
 
   // MakePhasorMatrix builds shifts x chunks; row s is this shift's phasor
   // over the chunks.
@@ -68,6 +67,14 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
     if (mirror >= 0) paired[mirror] = true;
     terms_.push_back({s, mirror});
   }
+  term_phasors_.resize(terms_.size() * num_chunks_ * 8);
+  for (size_t t = 0; t < terms_.size(); ++t) {
+    for (int k = 0; k < num_chunks_; ++k) {
+      float* phasor = term_phasors_.data() + (t * num_chunks_ + k) * 8;
+      std::fill(phasor, phasor + 4, phasor_real_[terms_[t].shift * num_chunks_ + k]);
+      std::fill(phasor + 4, phasor + 8, phasor_imag_[terms_[t].shift * num_chunks_ + k]);
+    }
+  }
 
   detection_span_ = std::max(2 * frame_size_ - 1, detection_window);
   detection_num_frames_ = (detection_span_ + 1 - frame_size_) / frame_size_;
@@ -86,13 +93,9 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
 
   const int history = static_cast<int>(audio_dsp::NextPowerOfTwo(
       static_cast<unsigned>(HistorySize(noise_delay_, detection_span_, warm_up_))));
-  energies_.resize(static_cast<size_t>(history) * num_shifts_);
+  energies_.resize(static_cast<size_t>(history) * row_stride_);
   energies_mask_ = history - 1;
   best_energy_ = CircularArray<float>(noise_delay_ + 1);
-  frame_sums_.resize(static_cast<size_t>(frame_size_) * num_shifts_);
-  zeros_.assign(num_shifts_, 0.0f);
-  frame_sum_max_ = CircularArray<double>(detection_num_shifts_);
-  frame_sum_total_ = CircularArray<double>(detection_num_shifts_);
   chunk_real_.resize(num_chunks_ * kLanes);
   chunk_imag_.resize(num_chunks_ * kLanes);
   block_energies_.resize(num_shifts_ * kLanes);
@@ -107,9 +110,6 @@ void AcquisitionScorer::Reset() {
   noise_state2_ = 0.0;
   positions_scored_ = 0;
   std::fill(energies_.begin(), energies_.end(), 0.0f);
-  std::fill(frame_sums_.begin(), frame_sums_.end(), 0.0);
-  frame_phase_ = 0;
-  frame_count_ = 0;
 }
 
 void AcquisitionScorer::ScorePointers(const float* real, const float* imag,
@@ -182,17 +182,18 @@ void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int cou
   for (int half = 0; half < kLanes; half += 4) {
     const float* cr = chunk_real_.data() + half;
     const float* ci = chunk_imag_.data() + half;
+    const float* phasors = term_phasors_.data();
     for (const ShiftTerm& term : terms_) {
-      const float* pr = phasor_real_.data() + term.shift * num_chunks_;
-      const float* pi = phasor_imag_.data() + term.shift * num_chunks_;
       Float4 cx = {}, dy = {}, cy = {}, dx = {};
-      for (int k = 0; k < num_chunks_; ++k) {
+      for (int k = 0; k < num_chunks_; ++k, phasors += 8) {
         const Float4 x = Load4(cr + k * kLanes);
         const Float4 y = Load4(ci + k * kLanes);
-        cx += x * pr[k];
-        dy += y * pi[k];
-        cy += y * pr[k];
-        dx += x * pi[k];
+        const Float4 c = Load4(phasors);
+        const Float4 d = Load4(phasors + 4);
+        cx += x * c;
+        dy += y * d;
+        cy += y * c;
+        dx += x * d;
       }
       const Float4 re = cx - dy, im = cy + dx;
       Store4(block_energies_.data() + term.shift * kLanes + half, re * re + im * im);
@@ -203,6 +204,19 @@ void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int cou
       }
     }
   }
+  // Each lane's largest energy and energy sum (in double, shift by shift,
+  // as the background's mean is defined).
+  Float4 best0 = Load4(block_energies_.data()), best1 = Load4(block_energies_.data() + 4);
+  for (int lane = 0; lane < kLanes; ++lane) block_sum_[lane] = 0.0;
+  for (int s = 0; s < num_shifts_; ++s) {
+    const float* energies = block_energies_.data() + s * kLanes;
+    const Float4 e0 = Load4(energies), e1 = Load4(energies + 4);
+    best0 = e0 > best0 ? e0 : best0;
+    best1 = e1 > best1 ? e1 : best1;
+    for (int lane = 0; lane < kLanes; ++lane) block_sum_[lane] += energies[lane];
+  }
+  Store4(block_best_, best0);
+  Store4(block_best_ + 4, best1);
   // Only the positions asked for: the others' slots may still hold history.
   for (int lane = 0; lane < count; ++lane) {
     float* energies = Energies(positions_scored_ + lane);
@@ -210,58 +224,21 @@ void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int cou
   }
 }
 
-void AcquisitionScorer::FinishPosition(std::vector<float>* acquisition_scores) {
+void AcquisitionScorer::FinishPosition(float best, double sum,
+                                       std::vector<float>* acquisition_scores) {
   const int64_t n = positions_scored_;
-  const int num_shifts = num_shifts_;
-  const float* scores = Energies(n);
-  double sum = 0.0;
-  float best = scores[0];
-  for (int s = 0; s < num_shifts; ++s) {
-    sum += scores[s];
-    best = std::max(best, scores[s]);
-  }
   best_energy_[n] = best;
-
-  // Frame-integrated energies of n: those of n - F, plus n, less the frame
-  // that falls out. Once per detection_num_frames_ frames they are summed
-  // afresh (newest first, like a request would), so that rounding cannot
-  // build up.
-  double* frame_sums = frame_sums_.data() + frame_phase_ * num_shifts;
-  if (frame_count_ == 0) {
-    for (int s = 0; s < num_shifts; ++s) frame_sums[s] = scores[s];
-    for (int j = 1; j < detection_num_frames_ && n - j * frame_size_ >= 0; ++j) {
-      const float* older = Energies(n - static_cast<int64_t>(j) * frame_size_);
-      for (int s = 0; s < num_shifts; ++s) frame_sums[s] += older[s];
-    }
-  } else {
-    const int64_t leaving = n - static_cast<int64_t>(detection_num_frames_) * frame_size_;
-    const float* old = leaving >= 0 ? Energies(leaving) : zeros_.data();
-    for (int s = 0; s < num_shifts; ++s) frame_sums[s] = frame_sums[s] + scores[s] - old[s];
-  }
-  double frame_max = frame_sums[0];
-  double frame_total = 0.0;
-  for (int s = 0; s < num_shifts; ++s) {
-    frame_max = std::max(frame_max, frame_sums[s]);
-    frame_total += frame_sums[s];
-  }
-  frame_sum_max_[n] = frame_max;
-  frame_sum_total_[n] = frame_total;
-  if (++frame_phase_ == frame_size_) {
-    frame_phase_ = 0;
-    if (++frame_count_ == detection_num_frames_) frame_count_ = 0;
-  }
-
   if (n == warm_up_ - 1) {
     // Start the background at the mean of the first positions rather than
     // at zero, so that early scores are not inflated.
     double warm_sum = 0.0;
     for (int64_t p = 0; p < warm_up_; ++p) {
       const float* energies = Energies(p);
-      for (int s = 0; s < num_shifts; ++s) warm_sum += energies[s];
+      for (int s = 0; s < num_shifts_; ++s) warm_sum += energies[s];
     }
-    noise_state1_ = noise_state2_ = warm_sum / (static_cast<double>(warm_up_) * num_shifts);
+    noise_state1_ = noise_state2_ = warm_sum / (static_cast<double>(warm_up_) * num_shifts_);
   } else if (n > warm_up_ - 1) {
-    const double mean = sum / num_shifts;
+    const double mean = sum / num_shifts_;
     noise_state1_ += noise_weight_ * (mean - noise_state1_);
     noise_state2_ += noise_weight_ * (noise_state1_ - noise_state2_);
   }
@@ -311,7 +288,9 @@ void AcquisitionScorer::ComputeScores(const float* baseband_real_signal,
   for (int start = 0; start < positions; start += kLanes) {
     const int lanes = std::min(kLanes, positions - start);
     ScoreBlock(reader_real_.data() + start, reader_imag_.data() + start, lanes);
-    for (int lane = 0; lane < lanes; ++lane) FinishPosition(acquisition_scores);
+    for (int lane = 0; lane < lanes; ++lane) {
+      FinishPosition(block_best_[lane], block_sum_[lane], acquisition_scores);
+    }
   }
   // Consumed samples go in bulk, so each sample is moved about once.
   if (positions > 0) {
@@ -324,14 +303,36 @@ void AcquisitionScorer::ComputeScores(const float* baseband_real_signal,
 }
 
 float AcquisitionScorer::GetBroadcasterScore(bool normalize) const {
+  using audio_dsp::Float4;
+  using audio_dsp::Load4;
   if (frame_size_ + positions_scored_ <= detection_span_) return 0.0f;
-  // Lag l stands for the frame-integrated energies of position latest - 1 - l.
+  // Lag l integrates the energies at latest - 1 - l, one frame earlier, and
+  // so on, newest first, sixteen shifts at a time (in single precision: a
+  // window of a few dozen frames).
   const int64_t latest = positions_scored_;
   double best = 0.0;
   double total = 0.0;
   for (int lag = 0; lag < detection_num_shifts_; ++lag) {
-    best = std::max(best, frame_sum_max_[latest - 1 - lag]);
-    total += frame_sum_total_[latest - 1 - lag];
+    for (int first = 0; first < row_stride_; first += 16) {
+      Float4 sum0 = {}, sum1 = {}, sum2 = {}, sum3 = {};
+      for (int frame = 0; frame < detection_num_frames_; ++frame) {
+        const float* energies =
+            Energies(latest - 1 - lag - static_cast<int64_t>(frame) * frame_size_) + first;
+        sum0 += Load4(energies);
+        sum1 += Load4(energies + 4);
+        sum2 += Load4(energies + 8);
+        sum3 += Load4(energies + 12);
+      }
+      float sums[16];
+      audio_dsp::Store4(sums, sum0);
+      audio_dsp::Store4(sums + 4, sum1);
+      audio_dsp::Store4(sums + 8, sum2);
+      audio_dsp::Store4(sums + 12, sum3);
+      for (int s = 0; s < std::min(16, num_shifts_ - first); ++s) {
+        best = std::max(best, static_cast<double>(sums[s]));
+        total += sums[s];
+      }
+    }
   }
   if (!normalize) return static_cast<float>(best);
   // The divisor deliberately leaves out the number of shifts.

@@ -14,9 +14,9 @@
 // Cost: per position, one pass over the frame (F multiply-adds per part) for
 // eight positions at a time, their chunk correlations held in four-lane
 // vectors whose lanes are positions, and one pass over the chunks per pair of
-// opposite shifts (a shift and its mirror share their products); the
-// broadcaster score keeps its frame-integrated energies up to date as
-// positions arrive, so a request reads one value per lag.
+// opposite shifts (a shift and its mirror share their products). The
+// broadcaster score costs nothing per position; a request adds up the
+// detection window's energies, four shifts per vector.
 //
 // Not thread-safe. Allocates at construction and when an input block is
 // larger than every earlier one; otherwise ComputeScores does not allocate
@@ -93,28 +93,35 @@ class AcquisitionScorer {
   void ScorePointers(const float* real, const float* imag, float* shift_scores) const;
   // Shift energies of the `count` (<= kLanes) positions starting at `real`
   // and `imag` into the history, for the positions from positions_scored_
-  // on. Reads kLanes - 1 + F samples of each part whatever the count.
+  // on, with each one's largest energy and its energies' sum into
+  // block_best_ and block_sum_. Reads kLanes - 1 + F samples of each part
+  // whatever the count.
   void ScoreBlock(const float* real, const float* imag, int count);
-  // Bookkeeping of the next position, whose energies are in the history:
-  // background, output, frame-integrated energies; counts the position.
-  void FinishPosition(std::vector<float>* acquisition_scores);
-  // The S energies of `position` in the history.
+  // Background and output of the next position, whose largest energy and
+  // energy sum are given; counts the position.
+  void FinishPosition(float best, double sum, std::vector<float>* acquisition_scores);
+  // The S energies of `position` in the history (row_stride_ floats, the
+  // ones beyond S being 0).
   float* Energies(int64_t position) {
-    return energies_.data() + (position & energies_mask_) * num_shifts_;
+    return energies_.data() + (position & energies_mask_) * row_stride_;
   }
   const float* Energies(int64_t position) const {
-    return energies_.data() + (position & energies_mask_) * num_shifts_;
+    return energies_.data() + (position & energies_mask_) * row_stride_;
   }
 
   int frame_size_;
   int num_shifts_;
   int num_chunks_;
   int chunk_length_;
+  int row_stride_;  // S rounded up to a multiple of 16.
   std::vector<float> reference_;
   // Phasor of shift s at chunk k: (phasor_real_, phasor_imag_)[s * C + k].
   std::vector<float> phasor_real_;
   std::vector<float> phasor_imag_;
   std::vector<ShiftTerm> terms_;
+  // The phasors of terms_[t] at chunk k, each four times (real, then
+  // imaginary): 8 floats at (t * C + k) * 8.
+  std::vector<float> term_phasors_;
   int detection_span_;
   int detection_num_frames_;
   int detection_num_shifts_;
@@ -130,29 +137,20 @@ class AcquisitionScorer {
   int buffered_ = 0;
   double noise_state1_ = 0.0;
   double noise_state2_ = 0.0;
-  // Shift energies of the positions held, S per position, ring-indexed by
-  // position AND energies_mask_ (the capacity covers the detection span).
+  // Shift energies of the positions held, ring-indexed by position AND
+  // energies_mask_ (the capacity covers the detection span).
   std::vector<float> energies_;
   int64_t energies_mask_;
   // Each position's largest energy, for its output D positions later.
   CircularArray<float> best_energy_;
-  // Frame-integrated energies: for position t and shift s, the sum of the
-  // energies at t, t - F, ... (detection_num_frames_ of them), updated from
-  // those of t - F; held for the last F positions at (t mod F) * S.
-  std::vector<double> frame_sums_;
-  int frame_phase_ = 0;       // Next position mod F.
-  int frame_count_ = 0;       // Next position's frame number mod detection_num_frames_.
-  std::vector<float> zeros_;  // S zeros: the energies before the first position.
-  // Their largest value and their total, per position, for the last
-  // detection_num_shifts_ positions.
-  CircularArray<double> frame_sum_max_;
-  CircularArray<double> frame_sum_total_;
   int64_t positions_scored_ = 0;
-  // Per-block scratch: chunk correlations (C x kLanes, lanes innermost) and
-  // energies (S x kLanes).
+  // Per-block scratch: chunk correlations (C x kLanes, lanes innermost),
+  // energies (S x kLanes) and each lane's largest energy and energy sum.
   std::vector<float> chunk_real_;
   std::vector<float> chunk_imag_;
   std::vector<float> block_energies_;
+  float block_best_[kLanes];
+  double block_sum_[kLanes];
 };
 
 }  // namespace audio_vesknet

@@ -2,10 +2,14 @@
 
 #include <algorithm>
 #include <cmath>
+#include <memory>
 #include <random>
 #include <vector>
 
 #include "audio/vesknet/code_signal_generator.h"
+#include "audio/vesknet/vesknet_decoder.h"
+#include "audio/vesknet/vesknet_encoder.h"
+#include "audio/vesknet/vesknet_util.h"
 #include "gtest/gtest.h"
 
 namespace audio_vesknet {
@@ -255,6 +259,56 @@ TEST(AcquisitionScorerTest, EqualsTheDirectComputation) {
     // error counts.
     EXPECT_LT(LargestRelativeError(got, want, 0.01), 1e-5) << c.taps;
   }
+}
+
+// The same on the baseband of a real transmission: a token of the 44.1 kHz
+// coder played three times at 10 dB SNR into a decoder's front end, scored
+// by the decoder as it streams and, over the decoder's whole baseband
+// history, directly.
+TEST(AcquisitionScorerTest, EqualsTheDirectComputationOnTokenAudio) {
+  VesknetEncoderParams encoder_params;
+  encoder_params.broadcast_sample_rate = 44100;
+  const VesknetEncoder encoder(std::make_unique<SymbolWaveCoder>(SymbolWaveCoderParams()),
+                               encoder_params);
+  std::vector<float> token;
+  ASSERT_TRUE(encoder.EncodeToken({1, 2, 3, 4, 5, 6, 7, 8}, &token));
+  std::mt19937 rng(4);
+  std::normal_distribution<float> noise(0.0f, 0.5f / std::sqrt(2.0f) / std::sqrt(10.0f));
+  std::vector<float> audio(6000);
+  for (int r = 0; r < 3; ++r) audio.insert(audio.end(), token.begin(), token.end());
+  audio.resize(audio.size() + 6000);
+  for (float& sample : audio) sample = 32768.0f * (sample + noise(rng));
+
+  const SymbolWaveCoder& coder = encoder.symbol_wave_coder();
+  VesknetDecoderParams params;
+  params.max_buffer_duration = 10.0f;  // Nothing is dropped.
+  VesknetDecoder decoder(&coder, params);
+  decoder.Initialize(44100, 1);
+  for (size_t start = 0; start < audio.size(); start += 2048) {
+    decoder.ProcessSamples(std::vector<float>(
+        audio.begin() + start, audio.begin() + std::min(audio.size(), start + 2048)));
+  }
+  ASSERT_EQ(decoder.baseband_real().dropped(), 0);
+
+  std::vector<float> shifts;
+  MakeFrequencyOffsets(params.acquisition_doppler_step,
+                       coder.carrier_cycles_per_frame() * params.max_speed / 340.0f, &shifts);
+  DirectScorer direct(coder.baseband_code(), shifts, params.acquisition_num_chunks,
+                      static_cast<float>(params.noise_smoothing_length),
+                      static_cast<int>(std::round(params.acquisition_window_duration *
+                                                  decoder.baseband_sample_rate())));
+  const StreamBuffer<float>& real = decoder.baseband_real();
+  const StreamBuffer<float>& imag = decoder.baseband_imag();
+  std::vector<float> want;
+  direct.Add(std::vector<float>(real.data(), real.data() + real.size()),
+             std::vector<float>(imag.data(), imag.data() + imag.size()), &want);
+  const StreamBuffer<float>& scores = decoder.acquisition_scores();
+  const std::vector<float> got(scores.data(), scores.data() + scores.size());
+  EXPECT_GT(*std::max_element(want.begin(), want.end()), 50.0f);
+  EXPECT_LT(LargestRelativeError(got, want, 0.01), 1e-5);
+  const float broadcaster = direct.BroadcasterScore();
+  EXPECT_GT(broadcaster, params.broadcaster_threshold);
+  EXPECT_NEAR(decoder.GetSignalScore(), broadcaster, 1e-5f * broadcaster);
 }
 
 TEST(AcquisitionScorerTest, BroadcasterScoreNeedsAWindowAndARepeatingCode) {
