@@ -17,7 +17,6 @@ namespace audio_dsp {
 
 typedef float Float4 __attribute__((vector_size(16)));
 typedef double Double2 __attribute__((vector_size(16)));
-typedef float Float2 __attribute__((vector_size(8)));
 
 // p[0 .. 3].
 inline Float4 Load4(const float* p) {
@@ -29,19 +28,15 @@ inline Float4 Load4(const float* p) {
 // p[0 .. 3] = v.
 inline void Store4(float* p, Float4 v) { std::memcpy(p, &v, sizeof(v)); }
 
-// Lanes 0, 1 and lanes 2, 3 of v, widened to double (exactly).
-inline Double2 LowToDouble(Float4 v) {
-  return __builtin_convertvector(__builtin_shufflevector(v, v, 0, 1), Double2);
-}
-inline Double2 HighToDouble(Float4 v) {
-  return __builtin_convertvector(__builtin_shufflevector(v, v, 2, 3), Double2);
-}
+// Lanes 0, 1 and lanes 2, 3 of v, widened to double (exactly). (No eight-byte
+// vector types here: the 32-bit build handles those badly.)
+inline Double2 LowToDouble(Float4 v) { return Double2{v[0], v[1]}; }
+inline Double2 HighToDouble(Float4 v) { return Double2{v[2], v[3]}; }
 
 // (low[0], low[1], high[0], high[1]), each rounded to float.
 inline Float4 ToFloat4(Double2 low, Double2 high) {
-  const Float2 a = __builtin_convertvector(low, Float2);
-  const Float2 b = __builtin_convertvector(high, Float2);
-  return __builtin_shufflevector(a, b, 0, 1, 2, 3);
+  return Float4{static_cast<float>(low[0]), static_cast<float>(low[1]), static_cast<float>(high[0]),
+                static_cast<float>(high[1])};
 }
 
 }  // namespace audio_dsp
