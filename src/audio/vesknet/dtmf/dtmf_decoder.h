@@ -28,8 +28,10 @@
 // happens at construction and Init, and the per-block and per-request paths
 // reuse member buffers once they have reached the history's size (a request
 // builds only its candidate map, a few dozen entries, and its results).
-// Cost: per input sample one filter step per tone; per request
-// O(history x tones).
+// Cost: per input sample one filter step per tone (four tones per vector);
+// per request, normalisation and peak selection of the times that new
+// strengths reach (and, after the history moved, of the oldest window), then
+// O(history) for the noise smoothing, the timing and the candidates.
 // Not thread-safe: one thread at a time.
 
 #ifndef AUDIO_VESKNET_DTMF_DTMF_DECODER_H_
