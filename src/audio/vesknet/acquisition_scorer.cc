@@ -161,18 +161,24 @@ void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int cou
   for (int k = 0; k < num_chunks_; ++k) {
     const int begin = std::min(k * chunk_length_, frame_size_);
     const int end = std::min(begin + chunk_length_, frame_size_);
-    Float4 real0 = {}, real1 = {}, imag0 = {}, imag1 = {};
+    Float4 real0 = {}, real1 = {}, real2 = {}, imag0 = {}, imag1 = {}, imag2 = {};
     for (int n = begin; n < end; ++n) {
       const float r = reference[n];
       real0 += Load4(real + n) * r;
       real1 += Load4(real + n + 4) * r;
+      real2 += Load4(real + n + 8) * r;
       imag0 += Load4(imag + n) * r;
       imag1 += Load4(imag + n + 4) * r;
+      imag2 += Load4(imag + n + 8) * r;
     }
-    Store4(chunk_real_.data() + k * kLanes, real0);
-    Store4(chunk_real_.data() + k * kLanes + 4, real1);
-    Store4(chunk_imag_.data() + k * kLanes, imag0);
-    Store4(chunk_imag_.data() + k * kLanes + 4, imag1);
+    float* chunk_real = chunk_real_.data() + k * kLanes;
+    float* chunk_imag = chunk_imag_.data() + k * kLanes;
+    Store4(chunk_real, real0);
+    Store4(chunk_real + 4, real1);
+    Store4(chunk_real + 8, real2);
+    Store4(chunk_imag, imag0);
+    Store4(chunk_imag + 4, imag1);
+    Store4(chunk_imag + 8, imag2);
   }
 
   // Shift energies, four lanes at a time. With the phasor (c, d) of shift f
@@ -206,17 +212,19 @@ void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int cou
   }
   // Each lane's largest energy and energy sum (in double, shift by shift,
   // as the background's mean is defined).
-  Float4 best0 = Load4(block_energies_.data()), best1 = Load4(block_energies_.data() + 4);
   for (int lane = 0; lane < kLanes; ++lane) block_sum_[lane] = 0.0;
+  for (int group = 0; group < kLanes; group += 4) {
+    Float4 best = Load4(block_energies_.data() + group);
+    for (int s = 1; s < num_shifts_; ++s) {
+      const Float4 energies = Load4(block_energies_.data() + s * kLanes + group);
+      best = energies > best ? energies : best;
+    }
+    Store4(block_best_ + group, best);
+  }
   for (int s = 0; s < num_shifts_; ++s) {
     const float* energies = block_energies_.data() + s * kLanes;
-    const Float4 e0 = Load4(energies), e1 = Load4(energies + 4);
-    best0 = e0 > best0 ? e0 : best0;
-    best1 = e1 > best1 ? e1 : best1;
     for (int lane = 0; lane < kLanes; ++lane) block_sum_[lane] += energies[lane];
   }
-  Store4(block_best_, best0);
-  Store4(block_best_ + 4, best1);
   // Only the positions asked for: the others' slots may still hold history.
   for (int lane = 0; lane < count; ++lane) {
     float* energies = Energies(positions_scored_ + lane);

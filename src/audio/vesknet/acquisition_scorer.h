@@ -12,7 +12,7 @@
 // smoother's group delay, and output i always belongs to position i.
 //
 // Cost: per position, one pass over the frame (F multiply-adds per part) for
-// eight positions at a time, their chunk correlations held in four-lane
+// twelve positions at a time, their chunk correlations held in four-lane
 // vectors whose lanes are positions, and one pass over the chunks per pair of
 // opposite shifts (a shift and its mirror share their products). The
 // broadcaster score costs nothing per position; a request adds up the
@@ -78,8 +78,10 @@ class AcquisitionScorer {
   int64_t positions_scored() const { return positions_scored_; }
 
  private:
-  // Positions scored together, one per vector lane (two four-lane vectors).
-  static constexpr int kLanes = 8;
+  // Positions scored together, one per vector lane (three four-lane vectors
+  // per part: with their accumulators, the reference value and a load they
+  // fill the eight vector registers of 32-bit x86).
+  static constexpr int kLanes = 12;
 
   // A Doppler shift, and the shift whose phasors are its exact conjugates
   // (-1 when the list has none): the two energies come from the same four
