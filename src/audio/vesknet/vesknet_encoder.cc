@@ -55,23 +55,25 @@ bool VesknetEncoder::EncodeSymbols(const std::vector<int32_t>& symbols,
     all_symbols.push_back(ChecksumSymbol(coder.alphabet_size(), symbols));
   }
 
+  // The symbol waves in a row: straight into the output when it is
+  // broadcast as it is, else into a buffer for the resampler.
   std::vector<float> token;
-  token.reserve((all_symbols.size() + 1) * coder.frame_size());
+  std::vector<float>& waves = resampler_ == nullptr ? *output : token;
+  waves.clear();
+  waves.reserve((all_symbols.size() + 1) * coder.frame_size());
   const std::vector<float>& sync = coder.GetSyncSymbolWave();
-  token.insert(token.end(), sync.begin(), sync.end());
+  waves.insert(waves.end(), sync.begin(), sync.end());
   for (const int32_t symbol : all_symbols) {
     const std::vector<float>& wave = coder.GetSymbolWave(symbol);
-    token.insert(token.end(), wave.begin(), wave.end());
+    waves.insert(waves.end(), wave.begin(), wave.end());
   }
 
   const float coder_rate = coder.params().sample_rate;
-  if (resampler_ == nullptr) {
-    *output = std::move(token);
-  } else if (params_.single_sideband) {
+  if (resampler_ != nullptr && params_.single_sideband) {
     // Only the upper sideband: everything from the carrier up.
     const float carrier = coder.carrier_cycles_per_frame() * coder_rate / coder.frame_size();
     resampler_->BandPassAndResample(token, carrier, 0.5f * coder_rate, output);
-  } else {
+  } else if (resampler_ != nullptr) {
     resampler_->Resample(token, output);
   }
 
