@@ -2,9 +2,11 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstring>
 #include <limits>
 #include <utility>
 
+#include "audio/dsp/pcm_conversion.h"
 #include "audio/vesknet/crc16_coder.h"
 #include "base/logging.h"
 #include "social/tandry/audio/config_limits.h"
@@ -44,6 +46,18 @@ void AudioModemDecoder::ProcessSamples(const std::vector<float>& samples) {
     zintar_decoder_->ProcessSamples(raw_.data(), static_cast<int>(raw_.size()));
   }
   if (kind_ == kDtmf) dtmf_decoder_->ProcessSamples(samples);
+}
+
+void AudioModemDecoder::ProcessPcm16(const int16_t* samples, int count) {
+  if (kind_ == kZintar) {
+    // The listening mode may mix the block down in place: give it a copy.
+    raw_.resize(count);
+    std::memcpy(raw_.data(), samples, sizeof(int16_t) * static_cast<size_t>(count));
+    zintar_decoder_->ProcessSamples(raw_.data(), count);
+    return;
+  }
+  audio_dsp::Pcm16ToFloats(samples, count, &samples_);
+  ProcessSamples(samples_);
 }
 
 void AudioModemDecoder::ProcessSamplesWithZintar(int16_t* samples, int count) {

@@ -47,6 +47,34 @@ TEST(AudioModemDecoderTest, VerifiesAndStripsCrcBytes) {
   EXPECT_TRUE(std::equal(kMessage.begin(), kMessage.end(), results.tokens[0].bytes.begin()));
 }
 
+// 16-bit blocks are taken as their float values would be, for every kind.
+TEST(AudioModemDecoderTest, SixteenBitBlocksAreTheirFloatValues) {
+  std::vector<int16_t> pcm;
+  std::vector<float> played;
+  for (const float sample : Played(kMessage, 2)) {
+    pcm.push_back(static_cast<int16_t>(sample));
+    played.push_back(pcm.back());
+  }
+  DsssDecoderConfig zintar;
+  zintar.input_sample_rate = 48000;
+  zintar.use_zintar = true;
+  for (const bool listening : {false, true}) {
+    const auto floats = listening ? MakeDsssAudioModemDecoder(zintar) : Decoder();
+    const auto ints = listening ? MakeDsssAudioModemDecoder(zintar) : Decoder();
+    for (size_t start = 0; start < pcm.size(); start += 4096) {
+      const size_t end = std::min(pcm.size(), start + 4096);
+      floats->ProcessSamples(std::vector<float>(played.begin() + start, played.begin() + end));
+      ints->ProcessPcm16(pcm.data() + start, static_cast<int>(end - start));
+    }
+    DecodeResults a, b;
+    ASSERT_TRUE(floats->GetTokens(&a, 6, 2));
+    ASSERT_TRUE(ints->GetTokens(&b, 6, 2));
+    EXPECT_EQ(a.tokens[0].bytes, b.tokens[0].bytes);
+    EXPECT_EQ(a.frame_times, b.frame_times);
+    EXPECT_EQ(a.frame_scores, b.frame_scores);
+  }
+}
+
 TEST(AudioModemDecoderTest, TokensFailingTheCrcAreDropped) {
   const auto decoder = Decoder();
   // Eight bytes whose last two are not the CRC of the first six.
