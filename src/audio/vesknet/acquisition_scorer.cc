@@ -20,7 +20,30 @@ int HistorySize(int delay, int span, int warm_up) {
   return std::max(std::max(delay + 1, span), warm_up);
 }
 
+// Shifts per history row: a multiple of the sixteen summed per vector.
+int RowStride(int num_shifts) { return (num_shifts + 15) / 16 * 16; }
+
+int DetectionSpan(int frame_size, int detection_window) {
+  return std::max(2 * frame_size - 1, detection_window);
+}
+
+// The background smoother: two cascaded one-pole stages whose impulse
+// response has the spread of a box of noise_length positions.
+double NoisePole(float noise_length) {
+  const double q = static_cast<double>(noise_length) * noise_length / 24.0;
+  return 1.0 + (1.0 - std::sqrt(2.0 * q + 1.0)) / q;
+}
+int NoiseDelay(double pole) { return static_cast<int>(std::round(2.0 * pole / (1.0 - pole))); }
+
 }  // namespace
+
+int64_t AcquisitionScorer::HistoryFloats(int frame_size, int num_shifts, float noise_length,
+                                         int detection_window) {
+  const int delay = NoiseDelay(NoisePole(noise_length));
+  const int history = static_cast<int>(audio_dsp::NextPowerOfTwo(static_cast<unsigned>(
+      HistorySize(delay, DetectionSpan(frame_size, detection_window), std::max(delay, 10)))));
+  return static_cast<int64_t>(history) * RowStride(num_shifts);
+}
 
 AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
                                      const std::vector<float>& doppler_shifts, int num_chunks,
@@ -34,7 +57,7 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
   CHECK(frame_size_ > 0);
   CHECK(num_shifts_ > 0);
   chunk_length_ = (frame_size_ + num_chunks_ - 1) / num_chunks_;
-  row_stride_ = (num_shifts_ + 15) / 16 * 16;
+  row_stride_ = RowStride(num_shifts_);
 
   // MakePhasorMatrix builds shifts x chunks; row s is this shift's phasor
   // over the chunks.
@@ -76,19 +99,16 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
     }
   }
 
-  detection_span_ = std::max(2 * frame_size_ - 1, detection_window);
+  detection_span_ = DetectionSpan(frame_size_, detection_window);
   detection_num_frames_ = (detection_span_ + 1 - frame_size_) / frame_size_;
   CHECK(detection_num_frames_ >= 1);
   detection_num_shifts_ = detection_span_ + 1 - frame_size_ * detection_num_frames_;
   CHECK(detection_num_shifts_ >= frame_size_);
 
-  // Two cascaded one-pole stages whose impulse response has the spread of a
-  // box of noise_length positions.
   CHECK(noise_length > 0.0f);
-  const double q = static_cast<double>(noise_length) * noise_length / 24.0;
-  const double pole = 1.0 + (1.0 - std::sqrt(2.0 * q + 1.0)) / q;
+  const double pole = NoisePole(noise_length);
   noise_weight_ = 1.0 - pole;
-  noise_delay_ = static_cast<int>(std::round(2.0 * pole / (1.0 - pole)));
+  noise_delay_ = NoiseDelay(pole);
   warm_up_ = std::max(noise_delay_, 10);
 
   const int history = static_cast<int>(audio_dsp::NextPowerOfTwo(

@@ -34,6 +34,12 @@ namespace audio_vesknet {
 
 class AcquisitionScorer {
  public:
+  // Floats of energy history that a scorer of these arguments keeps (the
+  // bulk of its memory), without building it. Arguments as the constructor's;
+  // frame_size F > 0, num_shifts S > 0.
+  static int64_t HistoryFloats(int frame_size, int num_shifts, float noise_length,
+                               int detection_window);
+
   // reference: the code at the baseband rate (F samples, the frame).
   // doppler_shifts: shifts in cycles per frame (S values).
   // num_chunks: C > 0.

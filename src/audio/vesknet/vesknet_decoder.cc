@@ -62,8 +62,7 @@ VesknetDecoder::VesknetDecoder(const SymbolWaveCoder* symbol_wave_coder,
   baseband_filter_ = std::make_unique<audio_dsp::StreamingFirFilter>(baseband_filter_taps_);
 
   // The largest Doppler shift, in carrier cycles per frame.
-  const float max_shift =
-      static_cast<float>(coder_->carrier_cycles_per_frame() * params_.max_speed / kSpeedOfSound);
+  const float max_shift = MaxDopplerShift(coder_->carrier_cycles_per_frame(), params_);
   MakeFrequencyOffsets(params_.acquisition_doppler_step, max_shift, &acquisition_shifts_);
   scorer_ = std::make_unique<AcquisitionScorer>(
       coder_->baseband_code(), acquisition_shifts_, params_.acquisition_num_chunks,
@@ -105,6 +104,11 @@ VesknetDecoder::VesknetDecoder(std::unique_ptr<const SymbolWaveCoder> symbol_wav
 }
 
 VesknetDecoder::~VesknetDecoder() = default;
+
+float VesknetDecoder::MaxDopplerShift(int carrier_cycles_per_frame,
+                                      const VesknetDecoderParams& params) {
+  return static_cast<float>(carrier_cycles_per_frame * params.max_speed / kSpeedOfSound);
+}
 
 int VesknetDecoder::TokenPeriodFrames() const {
   return params_.symbols_in_token + (params_.use_checksum_symbol ? 1 : 0) + 1;

@@ -124,6 +124,10 @@ struct VesknetDecodeResults {
 
 class VesknetDecoder {
  public:
+  // The largest Doppler shift searched, in carrier cycles per frame, for a
+  // coder of `carrier_cycles_per_frame`.
+  static float MaxDopplerShift(int carrier_cycles_per_frame, const VesknetDecoderParams& params);
+
   // `symbol_wave_coder` must outlive the decoder.
   VesknetDecoder(const SymbolWaveCoder* symbol_wave_coder, const VesknetDecoderParams& params);
   // The decoder owns `symbol_wave_coder`.

@@ -70,9 +70,11 @@ bool VesknetEncoder::EncodeSymbols(const std::vector<int32_t>& symbols,
 
   const float coder_rate = coder.params().sample_rate;
   if (resampler_ != nullptr && params_.single_sideband) {
-    // Only the upper sideband: everything from the carrier up.
+    // Only the upper sideband: everything from the carrier up. A carrier at
+    // half the coder rate may round a hair above it in float: it is the top.
+    const float nyquist = 0.5f * coder_rate;
     const float carrier = coder.carrier_cycles_per_frame() * coder_rate / coder.frame_size();
-    resampler_->BandPassAndResample(token, carrier, 0.5f * coder_rate, output);
+    resampler_->BandPassAndResample(token, std::min(carrier, nyquist), nyquist, output);
   } else if (resampler_ != nullptr) {
     resampler_->Resample(token, output);
   }

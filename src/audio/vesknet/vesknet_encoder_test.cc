@@ -185,6 +185,26 @@ TEST(VesknetEncoderTest, SingleSidebandRemovesEverythingBelowTheCarrier) {
   EXPECT_LT(below, 1e-6 * above);
 }
 
+// A carrier at half the coder rate (4094 cycles in 8188-sample frames)
+// snaps to 11025.001 Hz in float: the upper sideband is then the top bin,
+// not a band that ends below where it starts.
+TEST(VesknetEncoderTest, SingleSidebandWithTheCarrierAtHalfTheCoderRate) {
+  SymbolWaveCoderParams coder;
+  coder.code_signal.assign(2047, 1.0f);
+  coder.sample_rate = 22050;
+  coder.upsampling_factor = 4;
+  coder.baseband_decimation_factor = 4;
+  coder.desired_carrier_frequency = 11025;
+  VesknetEncoderParams params;
+  params.broadcast_sample_rate = 22051;
+  params.single_sideband = true;
+  const auto encoder = MakeEncoder(coder, params);
+  ASSERT_GT(encoder->symbol_wave_coder().carrier_frequency(), 11025.0f);
+  std::vector<float> audio;
+  ASSERT_TRUE(encoder->EncodeToken(kToken, &audio));
+  EXPECT_FALSE(audio.empty());
+}
+
 TEST(VesknetEncoderTest, RefusesWrongInputWithoutTouchingTheOutput) {
   VesknetEncoderParams params;
   params.broadcast_sample_rate = 48000;

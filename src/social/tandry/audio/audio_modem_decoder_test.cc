@@ -175,11 +175,22 @@ TEST(AudioModemDecoderTest, ConfigLimitsAreInclusive) {
          c->waveform.number_of_taps = 11;
          c->waveform.upsampling_factor = out ? 33 : 32;
          c->waveform.baseband_decimation_factor = 1;
+         c->waveform.carrier_frequency = 1000;  // Few Doppler shifts to search.
          c->buffer_length_tokens = 1;
        },
        "a frame (code length x upsampling factor) may hold at most 65536 samples"},
       {[](DsssDecoderConfig* c, bool out) { c->waveform.sample_rate = out ? 384001 : 384000; },
        "the coder sample rate must lie in (0, 384000] Hz"},
+      // 11 taps at 48 kHz: 12623 carrier cycles per frame, 179 Doppler shifts
+      // (192 per history row); a 5 s window needs 65536 rows (48 MiB), 6 s
+      // need 131072 (96 MiB).
+      {[](DsssDecoderConfig* c, bool out) {
+         c->waveform.number_of_taps = 11;
+         c->buffer_length_tokens = 1;
+         c->acquisition_window_seconds = out ? 6 : 5;
+       },
+       "the acquisition window and the Doppler search would take more than 64 MiB: shorten the "
+       "window or lower the carrier's cycles per frame"},
   };
   for (const Case& c : cases) {
     DsssDecoderConfig config;
@@ -191,6 +202,16 @@ TEST(AudioModemDecoderTest, ConfigLimitsAreInclusive) {
   DtmfDecoderConfig dtmf;
   dtmf.bytes_in_token = 257;
   EXPECT_EQ(DtmfDecoderConfigError(dtmf), "the token must have 1 to 256 bytes");
+  // The product waveform's history fills exactly 2^24 floats with a 60 s window.
+  DsssDecoderConfig product;
+  product.acquisition_window_seconds = 60;
+  EXPECT_EQ(DsssDecoderConfigError(product), "");
+  dtmf = DtmfDecoderConfig();
+  dtmf.tone_frequencies.resize(64);
+  for (int i = 0; i < 64; ++i) dtmf.tone_frequencies[i] = 500.0f + 100.0f * i;
+  EXPECT_EQ(DtmfDecoderConfigError(dtmf), "");
+  dtmf.tone_frequencies.push_back(9000);
+  EXPECT_EQ(DtmfDecoderConfigError(dtmf), "a tone set may have at most 64 tones");
   dtmf = DtmfDecoderConfig();
   dtmf.sample_rate = 384001;
   EXPECT_EQ(DtmfDecoderConfigError(dtmf), "the sample rate must lie in (0, 384000] Hz");

@@ -8,6 +8,7 @@
 
 #include <jni.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <memory>
 #include <utility>
@@ -188,7 +189,11 @@ Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeGetMaxSafeInputSize(J
                                                                                jobject /*thiz*/,
                                                                                jint id) {
   AudioModemDecoder* decoder = FindDecoder(id, "nativeGetMaxSafeInputSize()");
-  return decoder == nullptr ? 0 : decoder->GetMaxSafeInputSize() * 2;
+  if (decoder == nullptr) return 0;
+  // In bytes, as far as a Java int counts: a huge history's size would
+  // overflow the doubling.
+  return static_cast<jint>(
+      std::min<int64_t>(int64_t{2} * decoder->GetMaxSafeInputSize(), INT32_MAX));
 }
 
 JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeRelease(
