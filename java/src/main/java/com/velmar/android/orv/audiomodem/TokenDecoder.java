@@ -1,10 +1,13 @@
 package com.velmar.android.orv.audiomodem;
 
+import static com.velmar.android.orv.audiomodem.Checks.require;
+
 import java.nio.ByteBuffer;
 import java.nio.ByteOrder;
 import java.util.ArrayList;
 import java.util.BitSet;
 import java.util.List;
+import java.util.Objects;
 import java.util.concurrent.locks.ReadWriteLock;
 import java.util.concurrent.locks.ReentrantReadWriteLock;
 import java.util.function.Supplier;
@@ -56,8 +59,18 @@ public final class TokenDecoder implements AutoCloseable {
     this.options = options;
   }
 
-  /** A DSSS decoder for transmitters using {@code config}. */
+  /**
+   * A DSSS decoder for transmitters using {@code config}.
+   *
+   * @throws IllegalArgumentException if the history ({@link DecoderOptions#bufferLengthTokens()}
+   *     token durations) would last more than 60 s
+   */
   public static TokenDecoder create(DsssConfig config, DecoderOptions options) {
+    Objects.requireNonNull(config, "config");
+    Objects.requireNonNull(options, "options");
+    // DsssDecoderConfigError (audio_modem_decoder.cc): what config and options check alone, and
+    // the history, which needs both.
+    requireHistory(config.tokenSeconds(), options);
     return changingTable(() -> {
       int id = USED_IDS.nextClearBit(0);
       TokenDecoder decoder =
@@ -78,13 +91,23 @@ public final class TokenDecoder implements AutoCloseable {
    * A DTMF decoder for transmitters using {@code config}. The listening mode is a DSSS feature and
    * is refused here.
    *
-   * @throws IllegalArgumentException for the listening mode, or if the native library refuses the
-   *     envelope
+   * @throws IllegalArgumentException for the listening mode, a microphone rate not within a factor
+   *     1000 of the DTMF sample rate, a history ({@link DecoderOptions#bufferLengthTokens()} token
+   *     durations) of more than 60 s, or if the native library refuses the envelope
    */
   public static TokenDecoder create(DtmfConfig config, DecoderOptions options) {
-    if (options.listeningMode()) {
-      throw new IllegalArgumentException("the listening mode hears DSSS transmitters only");
-    }
+    Objects.requireNonNull(config, "config");
+    Objects.requireNonNull(options, "options");
+    require(!options.listeningMode(), "the listening mode hears DSSS transmitters only");
+    // DtmfDecoderConfigError (audio_modem_decoder.cc): what config and options check alone, the
+    // rate ratio, which the resampler approximates by a fraction of denominator 2000 at most, and
+    // the history.
+    float ratio = options.microphoneRate() / config.sampleRate();
+    require(ratio >= Limits.MIN_DTMF_RATE_RATIO && ratio <= Limits.MAX_DTMF_RATE_RATIO,
+        "the microphone rate (" + options.microphoneRate()
+            + " Hz) must be within a factor 1000 of the DTMF sample rate (" + config.sampleRate()
+            + " Hz)");
+    requireHistory(config.tokenSeconds(), options);
     return changingTable(() -> {
       int id = USED_IDS.nextClearBit(0);
       TokenDecoder decoder =
@@ -102,6 +125,14 @@ public final class TokenDecoder implements AutoCloseable {
       USED_IDS.set(id);
       return decoder;
     });
+  }
+
+  // HistoryError (audio_modem_decoder.cc): the history lasts at most 60 s.
+  private static void requireHistory(double tokenSeconds, DecoderOptions options) {
+    double historySeconds = tokenSeconds * options.bufferLengthTokens();
+    require(historySeconds <= Limits.MAX_HISTORY_SECONDS,
+        "the history (bufferLengthTokens x " + tokenSeconds + " s per token) may last at most "
+            + (int) Limits.MAX_HISTORY_SECONDS + " s, not " + historySeconds + " s");
   }
 
   /** The modem this decoder hears: {@link Token#DSSS} ("dsss") or {@link Token#DTMF} ("dtmf"). */
