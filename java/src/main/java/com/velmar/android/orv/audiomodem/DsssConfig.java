@@ -360,6 +360,9 @@ public final class DsssConfig {
       require(broadcastSampleRate >= 1 && broadcastSampleRate <= Limits.MAX_SAMPLE_RATE_HZ,
           "broadcastSampleRate must be 1 to " + (int) Limits.MAX_SAMPLE_RATE_HZ + " Hz, not "
               + broadcastSampleRate);
+      require(tokenSeconds * broadcastSampleRate >= 1,
+          "a token must last at least one sample at the broadcast rate, not "
+              + tokenSeconds * broadcastSampleRate);
       require(carrierFrequency < broadcastSampleRate / 2.0f,
           "carrierFrequency (" + carrierFrequency
               + " Hz) must lie below half the broadcast sample rate (" + broadcastSampleRate

@@ -278,6 +278,8 @@ public final class DtmfConfig {
       require(!defaultTones || tonesPerSymbol == Limits.DEFAULT_DTMF_TONES_PER_SYMBOL,
           "the default tone set makes symbols of 2 tones");
       float[] tones = defaultTones ? Limits.DEFAULT_DTMF_TONES : toneFrequencies;
+      require(tones.length <= Limits.MAX_DTMF_TONES,
+          "a tone set may have at most " + Limits.MAX_DTMF_TONES + " tones, not " + tones.length);
       for (float f : tones) {
         if (!(f >= 0 && f < sampleRate / 2)) {
           throw new IllegalArgumentException(defaultTones

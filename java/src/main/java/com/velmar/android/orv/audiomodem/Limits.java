@@ -32,6 +32,13 @@ final class Limits {
   // audio_modem::kMaxDsssFrameSamples, config_limits.h.
   static final int MAX_DSSS_FRAME_SAMPLES = 65536;
 
+  // Tones of a DTMF tone set: audio_modem::kMaxDtmfTones, config_limits.h.
+  static final int MAX_DTMF_TONES = 64;
+
+  // Floats of acquisition history a DSSS decoder may keep (64 MiB):
+  // audio_modem::kMaxAcquisitionFloats, config_limits.h.
+  static final long MAX_ACQUISITION_FLOATS = 1L << 24;
+
   // Register length of the DSSS code: DsssWaveformConfigError, dsss_waveform_config.cc.
   static final int MIN_TAPS = 5;
   static final int MAX_TAPS = 11;
@@ -80,6 +87,34 @@ final class Limits {
   static final float[] DEFAULT_DTMF_TONES = defaultDtmfTones();
   static final float MAX_DEFAULT_DTMF_TONE = DEFAULT_DTMF_TONES[DEFAULT_DTMF_TONES.length - 1];
   static final int DEFAULT_DTMF_TONES_PER_SYMBOL = 2;
+
+  /**
+   * Floats of acquisition history of a DSSS decoder (window x Doppler shifts), computed as
+   * AcquisitionFloats (audio_modem_decoder.cc) computes it from the decoder's default tuning:
+   * SymbolWaveCoder::CarrierCyclesPerFrame, VesknetDecoder::MaxDopplerShift (1.2 m/s at 340 m/s),
+   * MakeFrequencyOffsets (steps of 0.5 cycles per frame) and AcquisitionScorer::HistoryFloats
+   * (noise length 300, rows of whole sixteens of shifts, a power-of-two history).
+   */
+  static long acquisitionHistoryFloats(int numberOfTaps, float coderSampleRate,
+      int upsamplingFactor, int basebandDecimationFactor, float carrierFrequency,
+      float acquisitionWindowSeconds) {
+    int frame = ((1 << numberOfTaps) - 1) * upsamplingFactor;
+    int cycles = (int) Math.floor((float) frame * carrierFrequency / coderSampleRate);
+    float maxShift = (float) (cycles * 1.2f / 340.0);
+    int shifts = 2 * Math.round(maxShift / 0.5f) + 1;
+    float basebandRate = coderSampleRate / basebandDecimationFactor;
+    int window = Math.round(acquisitionWindowSeconds * basebandRate);
+    double q = 300.0 * 300.0 / 24.0;
+    double pole = 1.0 + (1.0 - Math.sqrt(2.0 * q + 1.0)) / q;
+    int delay = (int) Math.round(2.0 * pole / (1.0 - pole));
+    int span = Math.max(2 * (frame / basebandDecimationFactor) - 1, window);
+    int needed = Math.max(Math.max(delay + 1, span), Math.max(delay, 10));
+    long history = Long.highestOneBit(needed);
+    if (history < needed) {
+      history <<= 1;
+    }
+    return history * ((shifts + 15) / 16 * 16);
+  }
 
   private static float[] defaultDtmfTones() {
     int[] semitoneOffsets = {0, 2, 4, 7, 9};

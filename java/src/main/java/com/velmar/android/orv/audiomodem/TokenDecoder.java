@@ -71,6 +71,13 @@ public final class TokenDecoder implements AutoCloseable {
     // DsssDecoderConfigError (audio_modem_decoder.cc): what config and options check alone, and
     // the history, which needs both.
     requireHistory(config.tokenSeconds(), options);
+    long floats = Limits.acquisitionHistoryFloats(config.numberOfTaps(), config.coderSampleRate(),
+        config.upsamplingFactor(), config.basebandDecimationFactor(), config.carrierFrequency(),
+        options.acquisitionWindowSeconds());
+    require(floats <= Limits.MAX_ACQUISITION_FLOATS,
+        "the acquisition window and the Doppler search would take more than "
+            + (Limits.MAX_ACQUISITION_FLOATS * 4 >> 20)
+            + " MiB: shorten the window or lower the carrier's cycles per frame");
     return changingTable(() -> {
       int id = USED_IDS.nextClearBit(0);
       TokenDecoder decoder =
@@ -285,14 +292,15 @@ public final class TokenDecoder implements AutoCloseable {
   }
 
   /**
-   * 16-bit samples (all channels) the next native call may carry without dropping history.
+   * 16-bit samples (all channels) the next native call may carry without dropping history, at
+   * most {@code Integer.MAX_VALUE / 2}.
    *
    * @throws IllegalStateException if the decoder is closed
    */
   public int maxSafeInputSamples() {
-    // The library answers in bytes, as an int that the largest histories (a minute of 64 channels
-    // at 384000 Hz) overflow; read unsigned, it still holds the exact count.
-    return call(() -> (int) (Integer.toUnsignedLong(peer.nativeGetMaxSafeInputSize(id)) / 2));
+    // The library answers in bytes, at most Integer.MAX_VALUE: the largest histories (a minute of
+    // 64 channels at 384000 Hz) hold more, and report that much.
+    return call(() -> peer.nativeGetMaxSafeInputSize(id) / 2);
   }
 
   // The native id of this decoder, and how many ids are taken now: for tests of id reuse.

@@ -127,6 +127,44 @@ class LimitsTest {
   }
 
   @Test
+  void shortestTokenMemoryOfTheSearchAndToneCount() {
+    // The shortest token (5 taps, upsampling 1, one byte of 8 one-bit symbols and the sync: 279
+    // samples at 48 kHz, 5.8 ms) leaves one sample at 173 Hz, none at 171 Hz.
+    DsssConfig.Builder shortest = DsssConfig.builder()
+                                      .code(5, 0)
+                                      .coder(48000f, 1, 1)
+                                      .bitsPerSymbol(1)
+                                      .messageBytes(1)
+                                      .crc(false)
+                                      .carrierFrequency(10f);
+    runs(shortest.broadcastSampleRate(173).build(), MIC_48K);
+    refused("a token must last at least one sample at the broadcast rate",
+        () -> shortest.broadcastSampleRate(171).build());
+    // 11 taps at 48 kHz search 179 Doppler shifts (192 per history row): a 5 s acquisition window
+    // keeps 65536 rows (48 MiB), 6 s keep 131072 (96 MiB, over the 64 MiB bound).
+    DsssConfig longCode = DsssConfig.builder().code(11, 0).messageBytes(1).build();
+    runs(longCode,
+        DecoderOptions.builder().microphoneRate(48000).acquisitionWindowSeconds(5f).build());
+    refused("would take more than 64 MiB",
+        ()
+            -> TokenDecoder.create(longCode,
+                DecoderOptions.builder()
+                    .microphoneRate(48000)
+                    .acquisitionWindowSeconds(6f)
+                    .build()));
+    // At most 64 tones.
+    float[] tones = new float[64];
+    for (int i = 0; i < tones.length; i++) {
+      tones[i] = 500f + 100f * i;
+    }
+    runs(DtmfConfig.builder().tones(tones, 2).build(), DecoderOptions.defaults());
+    float[] tooMany = java.util.Arrays.copyOf(tones, 65);
+    tooMany[64] = 9000f;
+    refused("a tone set may have at most 64 tones",
+        () -> DtmfConfig.builder().tones(tooMany, 2).build());
+  }
+
+  @Test
   void decoderOptionsAndHistory() {
     DsssConfig product = DsssConfig.defaults();
     runs(product, DecoderOptions.builder().microphoneRate(1000).channels(64).build());
