@@ -4,6 +4,8 @@
 #include <cstdlib>
 
 #include "tools/channel/babble.h"
+#include "tools/channel/noise.h"
+#include "tools/channel/random.h"
 
 namespace vesk_bench {
 

@@ -28,6 +28,8 @@
 #include "tools/bench/sweep_table.h"
 #include "tools/channel/babble.h"
 #include "tools/channel/channel_simulator.h"
+#include "tools/channel/noise.h"
+#include "tools/channel/random.h"
 
 namespace vesk_bench {
 namespace {

