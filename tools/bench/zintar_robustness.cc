@@ -87,7 +87,7 @@ void WakeTable(const Options& options, const char* table, const std::string& tit
         (sweep_speed ? air.channel.speed : air.channel.snr_db) = value;
         Point point;
         for (const double delay :
-             ForSeeds(options.bench.seeds, options.bench.threads,
+             ForSeeds(options.bench.seeds, options.bench.threads, options.bench.first_seed,
                       [&](uint64_t seed) { return WakeDelay(waveforms[series], air, seed); })) {
           if (delay < 0) continue;
           ++point.successes;
@@ -145,6 +145,7 @@ void TokenTable(const Options& options, CsvFile* csv) {
         trial.channel.snr_db = snr;
         trial.zintar = series == 0;
         return Summarize(ForSeeds(options.bench.seeds, options.bench.threads,
+                                  options.bench.first_seed,
                                   [&](uint64_t seed) { return RunDsssTrial(trial, seed); }));
       },
       csv);
