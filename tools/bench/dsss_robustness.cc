@@ -41,6 +41,7 @@ struct Options {
   double false_minutes = 10.0;
   std::string label = "defaults";  // Row label of the tune table.
   audio_vesknet::VesknetDecoderParams tuning;
+  ExcisionTuning excision;
 };
 
 Point RunPoint(const DsssTrial& trial, const Options& options) {
@@ -53,6 +54,7 @@ DsssTrial BaseTrial(const Options& options, const audio_modem::DsssWaveformConfi
   DsssTrial trial;
   trial.waveform = waveform;
   trial.tuning = options.tuning;
+  trial.excision = options.excision;
   trial.channel = options.bench.air.channel;
   trial.repeat = options.bench.air.repeat;
   return trial;
@@ -278,7 +280,7 @@ int main(int argc, char** argv) {
   if (status >= 0) return status;
   options.false_minutes = false_minutes;
   if (!vesk_bench::ApplyAssignments(tuning, [&](const std::string& assignment) {
-        return vesk_bench::SetTuning(assignment, &options.tuning);
+        return vesk_bench::SetTuning(assignment, &options.tuning, &options.excision);
       })) {
     return 2;
   }
