@@ -46,9 +46,9 @@ std::vector<ImpairmentTable> MakeTables() {
         c->level_db = v;
         c->snr_db = INFINITY;
       });
-  add("dropout", "20 ms recording dropouts, 0 dB SNR", "one dropout every s (0: none)",
-      {0, 4, 2, 1, 0.5, 0.25}, [](double v, const ModemBand&, ChannelParams* c) {
-        c->dropouts.interval_s = v;
+  add("dropout", "20 ms recording dropouts, 0 dB SNR", "dropouts per second",
+      {0, 0.25, 0.5, 1, 2, 4}, [](double v, const ModemBand&, ChannelParams* c) {
+        c->dropouts.interval_s = v > 0 ? 1.0 / v : 0.0;
         c->dropouts.length_s = 0.02;
         c->snr_db = 0;
       });
@@ -85,6 +85,15 @@ std::vector<ImpairmentTable> MakeTables() {
         c->random_tone_low_hz = band.low_hz;
         c->random_tone_high_hz = band.high_hz;
         c->tone_sir_db = v;
+        c->snr_db = 10;
+      });
+  // Bright music: 32 partials a note reach 17-20 kHz from the upper notes
+  // (1/k amplitudes, about 30 dB under their fundamentals there), so the
+  // DSSS band hears some of it too.
+  add("music", "Music (chords, 32 partials a note), 10 dB SNR", "signal-to-music dB",
+      {10, 0, -5, -10, -15, -20}, [](double v, const ModemBand&, ChannelParams* c) {
+        c->music_sir_db = v;
+        c->music.harmonics = 32;
         c->snr_db = 10;
       });
   add("impulses", "Claps and door slams, two a second, 10 dB SNR", "peak over signal RMS dB",

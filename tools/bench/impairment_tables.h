@@ -9,7 +9,7 @@
 //   clip              playback overdrive at 10 dB SNR
 //   agc               recording gain steps (one per second) at 0 dB SNR
 //   level             recording level without noise: 16-bit quantisation
-//   dropout           20 ms dropouts, versus their interval, at 0 dB SNR
+//   dropout           20 ms dropouts, versus how many a second, at 0 dB SNR
 //   dropout_length    dropouts once a second, versus their length, at 0 dB
 //   walk              a listener walking past (closest 0.5 m) at 0 dB SNR
 //   tone              one steady tone anywhere in the modem's band, versus
@@ -18,6 +18,8 @@
 //                     carrier; DTMF: 1200 Hz)
 //   tones2            two steady tones anywhere in the band, each at the
 //                     signal-to-tone ratio, at 10 dB SNR
+//   music             chords of harmonic notes, versus the signal-to-music
+//                     ratio, at 10 dB SNR
 //   impulses          two claps or door slams per second, versus their peak
 //                     over the signal's RMS, at 10 dB SNR
 //   second            a second transmitter (another token, 0.1 s later),

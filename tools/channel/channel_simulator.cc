@@ -10,6 +10,7 @@
 #include "base/logging.h"
 #include "tools/channel/babble.h"
 #include "tools/channel/convolution.h"
+#include "tools/channel/music.h"
 #include "tools/channel/noise.h"
 #include "tools/channel/playback_clipping.h"
 #include "tools/channel/room.h"
@@ -28,6 +29,7 @@ constexpr uint64_t kToneStream = 4;
 constexpr uint64_t kImpulseStream = 5;
 constexpr uint64_t kAgcStream = 6;
 constexpr uint64_t kDropoutStream = 7;
+constexpr uint64_t kMusicStream = 8;
 constexpr uint64_t kRoomStream = 16;        // + channel
 constexpr uint64_t kNoiseStream = 32;       // + channel
 constexpr uint64_t kSecondRoomStream = 48;  // + channel
@@ -103,7 +105,16 @@ Channels Transmit(const std::vector<float>& source, const Path& path, int64_t fr
   return heard;
 }
 
-// Step 8 of the header: babble, tones and impulses at their levels relative
+// `x` scaled to an RMS of 1 over its whole length (all zeros stay zeros).
+std::vector<float> ToUnitRms(std::vector<float> x) {
+  const double power = MeanSquare(x, 0, static_cast<int64_t>(x.size()));
+  if (power == 0.0) return x;
+  const float scale = static_cast<float>(1.0 / std::sqrt(power));
+  for (float& v : x) v *= scale;
+  return x;
+}
+
+// Step 8 of the header: babble, tones, music and impulses at their levels relative
 // to each channel's signal power, then the noise.
 void AddInterference(const ChannelParams& params, const std::vector<double>& signal_power,
                      Channels* wet) {
@@ -128,6 +139,11 @@ void AddInterference(const ChannelParams& params, const std::vector<double>& sig
     std::vector<float> unit(static_cast<size_t>(frames), 0.0f);
     AddTones(tones, 1.0, params.mic_rate, DeriveSeed(params.seed, kToneStream), &unit);
     add_scaled(unit, params.tone_sir_db);
+  }
+  if (std::isfinite(params.music_sir_db)) {
+    add_scaled(ToUnitRms(MakeMusic(frames, params.mic_rate, params.music,
+                                   DeriveSeed(params.seed, kMusicStream))),
+               params.music_sir_db);
   }
   if (params.impulses.per_second > 0.0 && signal_power[0] > 0.0) {
     AddImpulses(params.impulses.per_second,
@@ -159,6 +175,7 @@ void CheckParams(const ChannelParams& params) {
   CHECK(params.walk_closest_m > 0.0);
   CHECK(params.random_tones >= 0);
   CHECK(std::isfinite(params.tone_sir_db));
+  CHECK(params.music_sir_db > -INFINITY);
   CHECK(params.second_power_db < INFINITY);
 }
 

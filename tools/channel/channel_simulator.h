@@ -33,7 +33,7 @@
 // (random.h), never from the standard library's distributions, and
 // independent random streams are derived from the seed for each draw (the
 // lead-in, each channel's room and noise, the babble, the tones, the
-// impulses, the walk, the AGC and the dropouts), so changing one setting
+// music, the impulses, the walk, the AGC and the dropouts), so changing one setting
 // (say the SNR) leaves the other draws unchanged. The arithmetic is plain
 // IEEE single and double precision in a fixed order, and math-library
 // functions (log, sin, cos, exp) enter only in double precision ahead of a
@@ -58,6 +58,7 @@
 #include "tools/channel/device_response.h"
 #include "tools/channel/dropouts.h"
 #include "tools/channel/impulses.h"
+#include "tools/channel/music.h"
 #include "tools/channel/random.h"
 
 namespace vesk_channel {
@@ -111,6 +112,12 @@ struct ChannelParams {
   double random_tone_low_hz = 0.0;
   double random_tone_high_hz = 0.0;
   double tone_sir_db = 0.0;
+  // Signal-to-music ratio in dB (music power over the whole output);
+  // +infinity: no music. The same music reaches both channels. `music.peak`
+  // is ignored (the ratio sets the level); the chord roots and their notes
+  // must lie below half the microphone rate.
+  double music_sir_db = INFINITY;
+  MusicParams music;
   // Claps and door slams; none by default. Needs mic_rate >= 8000.
   ImpulseParams impulses;
   // A second transmitter (PlayThroughChannel's second source): its power

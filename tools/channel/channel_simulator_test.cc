@@ -265,6 +265,28 @@ TEST(PlayThroughChannelTest, TonesStandAtTheirLevelBelowTheSignal) {
   EXPECT_NEAR(MeanSquare(x, 0, out.signal_start) / (signal * signal / 2), 300.0, 3.0);
 }
 
+TEST(PlayThroughChannelTest, MusicStandsAtItsLevelBelowTheSignal) {
+  ChannelParams p;
+  p.mic_rate = 48000;
+  p.lead_in_s = 0.5;
+  p.level_db = -30;  // Room for the music within 16 bits.
+  const std::vector<float> source = Tone(5000, 48000, 1.0);
+  const std::vector<double> clean = Channel(PlayThroughChannel(source, 48000, p), 0);
+  p.music_sir_db = -10;
+  p.music.harmonics = 2;  // Every partial below 2.1 kHz, clear of the tone.
+  const ChannelOutput out = PlayThroughChannel(source, 48000, p);
+  std::vector<double> music = Channel(out, 0);
+  ASSERT_EQ(music.size(), clean.size());
+  for (size_t i = 0; i < music.size(); ++i) music[i] -= clean[i];
+  // The tone of amplitude 0.5 at -30 dB has power (0.5 x 32768 x 10^-1.5)^2
+  // / 2; the music over the whole output ten times that.
+  const double signal = 0.5 * 32768 * std::pow(10, -1.5);
+  EXPECT_NEAR(MeanSquare(music, 0, music.size()) / (signal * signal / 2), 10.0, 0.05);
+  // Music and nothing else in the lead-in, and none of it at the tone.
+  EXPECT_GT(MeanSquare(music, 0, out.signal_start), 0.5 * signal * signal);
+  EXPECT_LT(Amplitude(music, 0, music.size(), 5000, 48000), 0.01 * signal);
+}
+
 TEST(PlayThroughChannelTest, SecondTransmitterAtItsPowerRatioAndOffset) {
   ChannelParams p;
   p.mic_rate = 48000;

@@ -94,6 +94,13 @@ void AddOverTheAirOptions(OptionParser* parser, OverTheAir* air) {
   parser->AddDouble("tone-sir", &c.tone_sir_db, "signal-to-tone ratio of each tone, dB")
       .Range(-60, 60)
       .Placeholder("DB");
+  parser
+      ->AddDouble("music", &c.music_sir_db,
+                  "music (chords of harmonic notes) at this signal-to-music ratio, dB; inf: none")
+      .Range(-60, INFINITY)
+      .Placeholder("DB");
+  parser->AddInt("music-harmonics", &c.music.harmonics, "partials of each note of the music")
+      .Range(1, 64);
   parser->AddDouble("impulses", &c.impulses.per_second, "claps and door slams per second")
       .Range(0, 20);
   parser
@@ -172,6 +179,10 @@ std::string DescribeImpairments(const vesk_channel::ChannelParams& c) {
               "-" + FormatNumber(c.random_tone_high_hz) + " Hz)";
     }
     parts.push_back(text + " at signal-to-tone " + FormatNumber(c.tone_sir_db) + " dB");
+  }
+  if (std::isfinite(c.music_sir_db)) {
+    parts.push_back("music (" + std::to_string(c.music.harmonics) +
+                    " partials a note) at signal-to-music " + FormatNumber(c.music_sir_db) + " dB");
   }
   if (c.impulses.per_second > 0) {
     parts.push_back(FormatNumber(c.impulses.per_second) + " impulses/s peaking " +

@@ -160,7 +160,8 @@ TEST(OverTheAirTest, OptionsSetTheRoomWithinTheSimulatorsRanges) {
                                              {"--overdrive", "-1"},
                                              {"--tones", "0"},
                                              {"--walk", "4"},
-                                             {"--second", "inf"}}) {
+                                             {"--second", "inf"},
+                                             {"--music-harmonics", "0"}}) {
     EXPECT_FALSE(parser.Parse(bad, &error)) << bad[0];
   }
 }
@@ -170,16 +171,48 @@ TEST(OverTheAirTest, ImpairmentOptionsSetTheChannel) {
   OptionParser parser;
   AddOverTheAirOptions(&parser, &air);
   std::string error;
-  ASSERT_TRUE(parser.Parse({"--level",         "-30",        "--speaker",        "budget",
-                            "--microphone",    "flagship",   "--overdrive",      "6",
-                            "--agc",           "20",         "--agc-interval",   "2",
-                            "--dropout",       "0.04",       "--dropout-every",  "0.5",
-                            "--walk",          "1.2",        "--walk-closest",   "0.7",
-                            "--tones",         "1200,18600", "--random-tones",   "2",
-                            "--tone-band-low", "15500",      "--tone-band-high", "21500",
-                            "--tone-sir",      "-20",        "--impulses",       "2",
-                            "--impulse-peak",  "30",         "--second",         "-6",
-                            "--second-offset", "0.2"},
+  ASSERT_TRUE(parser.Parse({"--level",
+                            "-30",
+                            "--speaker",
+                            "budget",
+                            "--microphone",
+                            "flagship",
+                            "--overdrive",
+                            "6",
+                            "--agc",
+                            "20",
+                            "--agc-interval",
+                            "2",
+                            "--dropout",
+                            "0.04",
+                            "--dropout-every",
+                            "0.5",
+                            "--walk",
+                            "1.2",
+                            "--walk-closest",
+                            "0.7",
+                            "--tones",
+                            "1200,18600",
+                            "--random-tones",
+                            "2",
+                            "--tone-band-low",
+                            "15500",
+                            "--tone-band-high",
+                            "21500",
+                            "--tone-sir",
+                            "-20",
+                            "--impulses",
+                            "2",
+                            "--impulse-peak",
+                            "30",
+                            "--second",
+                            "-6",
+                            "--second-offset",
+                            "0.2",
+                            "--music",
+                            "3",
+                            "--music-harmonics",
+                            "24"},
                            &error))
       << error;
   const vesk_channel::ChannelParams& c = air.channel;
@@ -202,6 +235,8 @@ TEST(OverTheAirTest, ImpairmentOptionsSetTheChannel) {
   EXPECT_EQ(c.impulses.peak_over_signal_db, 30);
   EXPECT_EQ(c.second_power_db, -6);
   EXPECT_EQ(c.second_offset_s, 0.2);
+  EXPECT_EQ(c.music_sir_db, 3);
+  EXPECT_EQ(c.music.harmonics, 24);
   EXPECT_EQ(OverTheAirError(air), "");
 }
 
