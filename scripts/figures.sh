@@ -29,10 +29,14 @@ for table in "${tables[@]}"; do
     exit 2
   fi
 done
-cmake -S . -B build/figures -DVESK_BUILD_TESTS=OFF -DVESK_BUILD_JAVA=OFF > /dev/null
-cmake --build build/figures -j "$JOBS" \
+# FIGURES_BUILD=build/host uses the programs of an existing build instead.
+build=${FIGURES_BUILD:-build/figures}
+if [ -z "${FIGURES_BUILD:-}" ]; then
+  cmake -S . -B "$build" -DVESK_BUILD_TESTS=OFF -DVESK_BUILD_JAVA=OFF > /dev/null
+fi
+cmake --build "$build" -j "$JOBS" \
   --target dsss_robustness dtmf_robustness zintar_robustness > /dev/null
-bench=build/figures/tools/bench
+bench=$build/tools/bench
 out=docs/figures
 mkdir -p "$out/impairments"
 
