@@ -25,18 +25,20 @@ class GammaFilter {
       : sample_rate_(sample_rate), order_(order), decay_(decay), gain_(1.0 - decay) {
     CHECK(sample_rate > 0.0);
     CHECK(order >= 1);
-    state_.assign(order, 0.0);
+    state_.assign(order, 0.0f);
   }
 
-  // Feeds one sample and returns the output of the last stage. The stages
-  // run in double precision: no rounding inside the recursion.
+  // Feeds one sample and returns the output of the last stage. Each stage is
+  // computed in double precision and stored as float, and the next stage
+  // reads the stored value: (in - state) x gain + state, rounded to float.
   float Step(float x) {
-    double in = x;
-    for (double& stage : state_) {
-      stage += (in - stage) * gain_;
+    float in = x;
+    for (float& stage : state_) {
+      const double previous = stage;
+      stage = static_cast<float>((static_cast<double>(in) - previous) * gain_ + previous);
       in = stage;
     }
-    return static_cast<float>(in);
+    return in;
   }
 
   // Group delay in samples: the mean of the impulse response,
@@ -48,17 +50,17 @@ class GammaFilter {
   double sample_rate() const { return sample_rate_; }
 
   // Clears the state of every stage, as after construction.
-  void Reset() { state_.assign(state_.size(), 0.0); }
+  void Reset() { state_.assign(state_.size(), 0.0f); }
   // Sets every stage to `value`: the state after a long steady input of
   // `value`, so that a stream starting near it does not ramp up from zero.
-  void Reset(float value) { state_.assign(state_.size(), static_cast<double>(value)); }
+  void Reset(float value) { state_.assign(state_.size(), value); }
 
  private:
   double sample_rate_;
   int order_;
   double decay_;
   double gain_;
-  std::vector<double> state_;  // One value per stage.
+  std::vector<float> state_;  // One value per stage.
 };
 
 // A GammaFilter whose impulse response has the standard deviation `stddev`

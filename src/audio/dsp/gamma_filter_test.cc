@@ -36,5 +36,21 @@ TEST(GammaFilterTest, ImpulseResponseHasUnitGainAndRequestedWidth) {
   EXPECT_LT(filter.Step(0.0f), 2.5f);
 }
 
+// Each stage is stored as float and the next stage reads the stored value.
+// Two stages of decay 0.3 (gain 0.7) given an impulse: the exact response is
+// 0.49 (n + 1) 0.3^n; the expected values are that recursion with every stage
+// rounded to float, worked out apart from this code. A state kept in double
+// gives other last bits (0x1.f5c29p-2 first).
+TEST(GammaFilterTest, StagesAreRoundedToFloat) {
+  GammaFilter filter(1.0, 2, 0.3);
+  const float expected[] = {0x1.f5c28ep-2f, 0x1.2d0e56p-2f, 0x1.0ef34ep-3f, 0x1.b1854ap-5f,
+                            0x1.4523f8p-6f};
+  for (int n = 0; n < 5; ++n) {
+    const float y = filter.Step(n == 0 ? 1.0f : 0.0f);
+    EXPECT_EQ(y, expected[n]) << n;
+    EXPECT_NEAR(y, 0.49 * (n + 1) * std::pow(0.3, n), 1e-7) << n;
+  }
+}
+
 }  // namespace
 }  // namespace audio_dsp
