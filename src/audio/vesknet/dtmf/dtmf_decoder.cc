@@ -186,9 +186,8 @@ void DtmfDecoder::ProcessSamples(const std::vector<float>& received_samples) {
     return;
   }
   CHECK(received_samples.size() % num_channels_ == 0);
-  // The mean of the channels.
   DownmixChannels(samples, static_cast<int>((count - first) / num_channels_), num_channels_,
-                  1.0f / static_cast<float>(num_channels_), &mono_);
+                  Downmix::kMean, &mono_);
   FeedMono(mono_);
 }
 
