@@ -34,11 +34,32 @@ class GammaFilter {
   float Step(float x) {
     float in = x;
     for (float& stage : state_) {
-      const double previous = stage;
-      stage = static_cast<float>((static_cast<double>(in) - previous) * gain_ + previous);
+      stage = StageStep(in, stage, gain_);
       in = stage;
     }
     return in;
+  }
+
+  // Step over input[0 .. count) in order, writing output i to output[i]
+  // unless output is null. output may be input, or lie before it (output <=
+  // input): each input is read before the output at or after it is written.
+  // Filters of up to four stages keep their state in registers meanwhile;
+  // the results equal Step's.
+  void Process(const float* input, int count, float* output) {
+    switch (order_) {
+      case 1:
+        return ProcessStages<1>(input, count, output);
+      case 2:
+        return ProcessStages<2>(input, count, output);
+      case 3:
+        return ProcessStages<3>(input, count, output);
+      case 4:
+        return ProcessStages<4>(input, count, output);
+    }
+    for (int i = 0; i < count; ++i) {
+      const float y = Step(input[i]);
+      if (output != nullptr) output[i] = y;
+    }
   }
 
   // Group delay in samples: the mean of the impulse response,
@@ -56,6 +77,28 @@ class GammaFilter {
   void Reset(float value) { state_.assign(state_.size(), value); }
 
  private:
+  // One stage: (in - state) x gain + state in double, rounded to float.
+  static float StageStep(float in, float state, double gain) {
+    const double previous = state;
+    return static_cast<float>((static_cast<double>(in) - previous) * gain + previous);
+  }
+
+  template <int kOrder>
+  void ProcessStages(const float* input, int count, float* output) {
+    float stages[kOrder];
+    for (int k = 0; k < kOrder; ++k) stages[k] = state_[k];
+    const double gain = gain_;
+    for (int i = 0; i < count; ++i) {
+      float in = input[i];
+      for (int k = 0; k < kOrder; ++k) {
+        stages[k] = StageStep(in, stages[k], gain);
+        in = stages[k];
+      }
+      if (output != nullptr) output[i] = in;
+    }
+    for (int k = 0; k < kOrder; ++k) state_[k] = stages[k];
+  }
+
   double sample_rate_;
   int order_;
   double decay_;

@@ -1,6 +1,9 @@
 #include "audio/dsp/gamma_filter.h"
 
+#include <algorithm>
 #include <cmath>
+#include <cstdint>
+#include <vector>
 
 #include "gtest/gtest.h"
 
@@ -49,6 +52,34 @@ TEST(GammaFilterTest, StagesAreRoundedToFloat) {
     const float y = filter.Step(n == 0 ? 1.0f : 0.0f);
     EXPECT_EQ(y, expected[n]) << n;
     EXPECT_NEAR(y, 0.49 * (n + 1) * std::pow(0.3, n), 1e-7) << n;
+  }
+}
+
+// Process is Step over an array, whatever the order, also in place and
+// writing behind its input, as the DTMF noise smoother does.
+TEST(GammaFilterTest, ProcessEqualsStep) {
+  std::vector<float> input(300);
+  uint32_t seed = 3;
+  for (float& x : input) {
+    seed = seed * 1664525u + 1013904223u;
+    x = static_cast<float>(seed >> 8) / 16777216.0f;
+  }
+  for (int order = 1; order <= 6; ++order) {
+    GammaFilter stepped(1.0, order, 0.9), processed(1.0, order, 0.9);
+    stepped.Reset(0.25f);
+    processed.Reset(0.25f);
+    std::vector<float> expected;
+    for (const float x : input) expected.push_back(stepped.Step(x));
+    std::vector<float> output(input.size());
+    processed.Process(input.data(), 100, output.data());
+    processed.Process(input.data() + 100, 50, nullptr);  // Outputs dropped.
+    // The rest 7 places further on, the outputs written 7 places behind.
+    std::vector<float> shifted(input.size() + 7);
+    std::copy(input.begin() + 150, input.end(), shifted.begin() + 157);
+    processed.Process(shifted.data() + 157, 150, shifted.data() + 150);
+    for (int i = 0; i < 100; ++i) ASSERT_EQ(output[i], expected[i]) << order << " " << i;
+    for (int i = 150; i < 300; ++i) ASSERT_EQ(shifted[i], expected[i]) << order << " " << i;
+    EXPECT_EQ(stepped.Step(1.0f), processed.Step(1.0f)) << order;  // The same state after.
   }
 }
 
