@@ -50,6 +50,10 @@ class StreamingFirFilter {
                       std::vector<std::complex<float>>* result) {
     CHECK(result);
     const std::size_t n = input.size();
+    if (n == 0) {  // Nothing to filter; an empty vector may have no storage.
+      result->clear();
+      return;
+    }
     const std::size_t num_taps = impulse_response_.size();
     const std::size_t kept = num_taps - 1;
     // The previous inputs, then this block, as interleaved floats.

@@ -21,6 +21,11 @@ TEST(StreamingFirFilterTest, CarriesStateAcrossCalls) {
   EXPECT_THAT(y, ElementsAre(Complex(1), Complex(3)));
   filter.ProcessSamples({3}, &y);
   EXPECT_THAT(y, ElementsAre(Complex(5)));
+  // An empty block is no block: nothing out, the state kept.
+  filter.ProcessSamples({}, &y);
+  EXPECT_TRUE(y.empty());
+  filter.ProcessSamples({4}, &y);
+  EXPECT_THAT(y, ElementsAre(Complex(7)));
   filter.Reset();
   filter.ProcessSamples({3}, &y);
   EXPECT_THAT(y, ElementsAre(Complex(3)));

@@ -50,6 +50,7 @@ void AudioModemDecoder::ProcessSamples(const std::vector<float>& samples) {
 }
 
 void AudioModemDecoder::ProcessPcm16(const int16_t* samples, int count) {
+  if (count <= 0) return;  // Nothing to hear (and nothing to copy).
   if (kind_ == kZintar) {
     // The listening mode may mix the block down in place: give it a copy.
     raw_.resize(count);
