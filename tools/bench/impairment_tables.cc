@@ -79,7 +79,7 @@ std::vector<ImpairmentTable> MakeTables() {
         c->tone_sir_db = v;
         c->snr_db = 10;
       });
-  add("tones2", "Two steady tones anywhere in the band, 10 dB SNR", "signal-to-tone dB, each",
+  add("tones2", "Two steady tones anywhere in the band, 10 dB SNR", "signal-to-tone dB of each",
       {10, 0, -5, -10, -15, -20}, [](double v, const ModemBand& band, ChannelParams* c) {
         c->random_tones = 2;
         c->random_tone_low_hz = band.low_hz;
