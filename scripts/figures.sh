@@ -67,7 +67,7 @@ for table in "${tables[@]}"; do
     "$bench/dtmf_robustness" "${common[@]}" --windows product \
       --csv "$out/impairments/${table}_dtmf_x$repeat.csv" > /dev/null
   done
-  awk -F, -f scripts/impairment_table.awk "$out/impairments/${table}"_*.csv \
+  awk -F, -f scripts/impairment_table.awk "$out/impairments/${table}"_{dsss,dtmf}_x*.csv \
     > "$out/impairments/$table.md"
 done
 gnuplot -e "dir='$out'; seeds=$SEEDS" scripts/figures.gp

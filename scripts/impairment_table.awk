@@ -2,7 +2,7 @@
 # both repetition counts), as the README shows it: a row per value of the
 # impairment, a column per series and repetition count, each cell the success
 # rate and, when any, the wrong tokens in parentheses.
-#   awk -F, -f scripts/impairment_table.awk docs/figures/impairments/tone_*.csv
+#   awk -F, -f scripts/impairment_table.awk docs/figures/impairments/tone_{dsss,dtmf}_x*.csv
 FNR == 1 { next }  # Each file's header.
 {
   variable = $2
