@@ -1,0 +1,104 @@
+// The soak program over a few simulated minutes: its output ends with a
+// well-formed RESULT line; loud tokens are all decoded, hostile sound
+// reports nothing, no token is false and the heap stays flat.
+
+#include <regex>
+#include <string>
+#include <vector>
+
+#include "gtest/gtest.h"
+#include "tools/common/subprocess.h"
+
+namespace {
+
+struct Result {
+  bool ok = false;  // The last line is a RESULT line.
+  std::string out;  // The whole output.
+  std::string hours;
+  int sent = -1, decoded = -1, false_tokens = -1;
+  long heap_start_kib = -1, heap_end_kib = -1, rss_peak_kib = -1;
+};
+
+Result RunSoak(std::vector<std::string> args) {
+  args.insert(args.begin(), {"--hours", "0.05"});
+  const vesk_tool::ProcessResult run = vesk_tool::RunProcess(SOAK, args);
+  EXPECT_EQ(run.exit_status, 0) << run.err;
+  static const std::regex kLine(
+      "RESULT hours=([0-9.]+) decoders=4 tokens_sent=([0-9]+) tokens_decoded=([0-9]+) "
+      "false_tokens=([0-9]+) heap_start_kib=([0-9]+) heap_end_kib=([0-9]+) "
+      "rss_peak_kib=([0-9]+)\n$");
+  Result result;
+  std::smatch m;
+  const size_t last_line = run.out.rfind('\n', run.out.size() - 2) + 1;
+  const std::string line = run.out.substr(last_line);
+  if (!std::regex_match(line, m, kLine)) {
+    ADD_FAILURE() << "no RESULT line at the end of:\n" << run.out;
+    return result;
+  }
+  result.ok = true;
+  result.out = run.out;
+  result.hours = m[1];
+  result.sent = std::stoi(m[2]);
+  result.decoded = std::stoi(m[3]);
+  result.false_tokens = std::stoi(m[4]);
+  result.heap_start_kib = std::stol(m[5]);
+  result.heap_end_kib = std::stol(m[6]);
+  result.rss_peak_kib = std::stol(m[7]);
+  return result;
+}
+
+// Tokens sent to `decoder`, from the per-decoder table.
+int SentTo(const Result& result, const std::string& decoder) {
+  std::smatch m;
+  const std::regex row("\\| " + decoder + " \\| ([0-9]+) \\|");
+  return std::regex_search(result.out, m, row) ? std::stoi(m[1]) : -1;
+}
+
+void ExpectFlatMemory(const Result& result) {
+  EXPECT_GT(result.heap_start_kib, 0);
+  EXPECT_LT(result.heap_end_kib - result.heap_start_kib, 64);
+  EXPECT_GT(result.rss_peak_kib, result.heap_end_kib);
+}
+
+TEST(SoakTest, LoudTokensAreAllDecodedAndNoneIsFalse) {
+  const Result result = RunSoak({"--min-snr", "10", "--max-snr", "20", "--seed", "3"});
+  ASSERT_TRUE(result.ok);
+  EXPECT_EQ(result.hours, "0.05");
+  EXPECT_GE(result.sent, 5);
+  EXPECT_EQ(result.decoded, result.sent);
+  EXPECT_EQ(result.false_tokens, 0);
+  ExpectFlatMemory(result);
+  // A token of the 48 kHz coder is sent to its plain decoder and to the
+  // listening mode.
+  const int dsss48 = SentTo(result, "DSSS 48k"), dsss44 = SentTo(result, "DSSS 44.1k");
+  const int dtmf = SentTo(result, "DTMF");
+  EXPECT_GT(dsss48, 0);
+  EXPECT_GT(dsss44, 0);
+  EXPECT_GT(dtmf, 0);
+  EXPECT_EQ(SentTo(result, "listening"), dsss48);
+  EXPECT_EQ(result.sent, 2 * dsss48 + dsss44 + dtmf);
+}
+
+// Over the whole SNR range some tokens are lost, none is false, and the same
+// seed gives the same counts.
+TEST(SoakTest, AnySnrNoFalseTokenAndRepeatable) {
+  const Result result = RunSoak({"--seed", "4"});
+  ASSERT_TRUE(result.ok);
+  EXPECT_GT(result.sent, 0);
+  EXPECT_LE(result.decoded, result.sent);
+  EXPECT_EQ(result.false_tokens, 0);
+  const Result again = RunSoak({"--seed", "4"});
+  EXPECT_EQ(again.sent, result.sent);
+  EXPECT_EQ(again.decoded, result.decoded);
+}
+
+TEST(SoakTest, HostileSoundReportsNothing) {
+  const Result result = RunSoak({"--hostile"});
+  ASSERT_TRUE(result.ok);
+  EXPECT_EQ(result.sent, 0);
+  EXPECT_EQ(result.decoded, 0);
+  EXPECT_EQ(result.false_tokens, 0);
+  ExpectFlatMemory(result);
+}
+
+}  // namespace
