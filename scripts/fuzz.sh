@@ -4,7 +4,9 @@
 # corpus (new inputs go to build/fuzz/corpus/, never into the sources).
 # Exits non-zero on any finding, printing the reproducer's path; prints one
 # summary line per target (executions, coverage, corpus).
-# Usage: scripts/fuzz.sh [SECONDS]
+# FUZZ_SEED fixes libFuzzer's random seed (the test command sets 1, so that a
+# CI run explores the same inputs each time); unset, each run draws its own.
+# Usage: [FUZZ_SEED=N] scripts/fuzz.sh [SECONDS]
 set -euo pipefail
 cd "$(dirname "$0")/.."
 seconds=${1:-60}
@@ -26,7 +28,7 @@ while read -r executable seeds; do
   findings=build/fuzz/findings/$name
   log=build/fuzz/$name.log
   mkdir -p "$corpus" "$findings"
-  if "$executable" -max_total_time="$seconds" -timeout=120 -rss_limit_mb=2560 \
+  if "$executable" ${FUZZ_SEED:+-seed="$FUZZ_SEED"} -max_total_time="$seconds" -timeout=120 -rss_limit_mb=2560 \
       -artifact_prefix="$findings/" -print_final_stats=1 "$corpus" "$seeds" < /dev/null > "$log" 2>&1; then
     runs=$(sed -n 's/^stat::number_of_executed_units: *//p' "$log")
     last=$(grep -E '^#[0-9]+[[:space:]].* cov: ' "$log" | tail -1 || true)

@@ -38,8 +38,16 @@ class FuzzInput {
   size_t remaining() const { return size_ - position_; }
 
   uint8_t Byte() { return position_ < size_ ? data_[position_++] : 0; }
-  uint16_t U16() { return static_cast<uint16_t>(Byte() | Byte() << 8); }
-  uint32_t U32() { return static_cast<uint32_t>(U16()) | static_cast<uint32_t>(U16()) << 16; }
+  // Low byte first; two statements, since the operands of one expression
+  // may be evaluated in either order.
+  uint16_t U16() {
+    const uint16_t low = Byte();
+    return static_cast<uint16_t>(low | Byte() << 8);
+  }
+  uint32_t U32() {
+    const uint32_t low = U16();
+    return low | static_cast<uint32_t>(U16()) << 16;
+  }
   bool Bool() { return (Byte() & 1) != 0; }
   // Any 32-bit pattern: NaN, infinities and denormals included.
   float Float() {

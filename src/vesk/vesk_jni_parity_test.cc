@@ -134,11 +134,7 @@ TEST(VeskJniParityTest, DecodersHearTheSameOnTheSameAudio) {
                         Case{"dtmf", VESK_MODEM_DTMF, false, 44100, 1, false},
                         Case{"listening mode, stereo", VESK_MODEM_DSSS, false, 48000, 2, true}}) {
     vesk_config config = Defaults(c.modem);
-    if (c.coder44100) {
-      config.dsss.coder_sample_rate_hz = 44100;
-      config.dsss.upsampling_factor = 15;
-      config.dsss.baseband_decimation_factor = 3;
-    }
+    if (c.coder44100) vesk_test::UseCoder44100(&config);
     config.dsss.broadcast_sample_rate_hz = c.rate;
     vesk_decoder_options options;
     vesk_decoder_options_defaults(&options);
@@ -164,9 +160,7 @@ TEST(VeskJniParityTest, DecodersHearTheSameOnTheSameAudio) {
 
 TEST(VeskJniParityTest, EncodersMakeTheSamePcm) {
   vesk_config config = Defaults(VESK_MODEM_DSSS);
-  config.dsss.coder_sample_rate_hz = 44100;
-  config.dsss.upsampling_factor = 15;
-  config.dsss.baseband_decimation_factor = 3;
+  vesk_test::UseCoder44100(&config);
   vesk_encoder* encoder = nullptr;
   ASSERT_EQ(vesk_encoder_create(&config, &encoder), VESK_OK);
   vesk_pcm pcm;

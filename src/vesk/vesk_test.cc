@@ -27,13 +27,8 @@ vesk_decoder_options Options(int rate) {
   return options;
 }
 
-struct Heard {
-  std::vector<uint8_t> message;
-  double time_seconds;
-  bool operator==(const Heard& other) const {
-    return message == other.message && time_seconds == other.time_seconds;
-  }
-};
+using vesk_test::Heard;
+using vesk_test::TakeHeard;
 
 // Feeds `pcm` in chunks of `chunk` samples, then flushes; every token heard.
 std::vector<Heard> Decode(const vesk_config& config, const vesk_decoder_options& options,
@@ -41,24 +36,14 @@ std::vector<Heard> Decode(const vesk_config& config, const vesk_decoder_options&
   vesk_decoder* decoder = nullptr;
   EXPECT_EQ(vesk_decoder_create(&config, &options, &decoder), VESK_OK) << vesk_last_error();
   std::vector<Heard> heard;
-  auto take = [&] {
-    const vesk_token* tokens = nullptr;
-    size_t count = 0;
-    ASSERT_EQ(vesk_decoder_take_tokens(decoder, &tokens, &count), VESK_OK);
-    for (size_t i = 0; i < count; ++i) {
-      heard.push_back(
-          {std::vector<uint8_t>(tokens[i].message, tokens[i].message + tokens[i].message_bytes),
-           tokens[i].time_seconds});
-    }
-  };
   for (size_t start = 0; start < pcm.size(); start += chunk) {
     EXPECT_EQ(
         vesk_decoder_process(decoder, pcm.data() + start, std::min(chunk, pcm.size() - start)),
         VESK_OK);
-    take();
+    TakeHeard(decoder, &heard);
   }
   EXPECT_EQ(vesk_decoder_flush(decoder), VESK_OK);
-  take();
+  TakeHeard(decoder, &heard);
   vesk_decoder_destroy(decoder);
   return heard;
 }
@@ -105,11 +90,7 @@ TEST(VeskCTest, DefaultsRoundTrip) {
                         Case{"dtmf", VESK_MODEM_DTMF, false, 48000, false},
                         Case{"listening mode", VESK_MODEM_DSSS, false, 48000, true}}) {
     vesk_config config = Defaults(c.modem);
-    if (c.coder44100) {
-      config.dsss.coder_sample_rate_hz = 44100;
-      config.dsss.upsampling_factor = 15;
-      config.dsss.baseband_decimation_factor = 3;
-    }
+    if (c.coder44100) vesk_test::UseCoder44100(&config);
     // The loudspeaker plays at the microphone's rate.
     config.dsss.broadcast_sample_rate_hz = c.microphone_rate;
     config.dtmf.sample_rate_hz = static_cast<float>(c.microphone_rate);
@@ -209,14 +190,7 @@ TEST(VeskCTest, FloatInputIsTheSameStream) {
       ASSERT_EQ(call % 3 == 2 ? vesk_decoder_process(decoder, pcm.data() + start, n)
                               : vesk_decoder_process_float(decoder, floats.data() + start, n),
                 VESK_OK);
-      const vesk_token* tokens = nullptr;
-      size_t count = 0;
-      ASSERT_EQ(vesk_decoder_take_tokens(decoder, &tokens, &count), VESK_OK);
-      for (size_t i = 0; i < count; ++i) {
-        heard.push_back(
-            {std::vector<uint8_t>(tokens[i].message, tokens[i].message + tokens[i].message_bytes),
-             tokens[i].time_seconds});
-      }
+      TakeHeard(decoder, &heard);
     }
     double seconds = 0;
     ASSERT_EQ(vesk_decoder_stream_seconds(decoder, &seconds), VESK_OK);

@@ -21,6 +21,34 @@ inline vesk_config Defaults(vesk_modem modem) {
   return config;
 }
 
+// The older 44.1 kHz DSSS coder: upsampling 15, decimation 3.
+inline void UseCoder44100(vesk_config* config) {
+  config->dsss.coder_sample_rate_hz = 44100;
+  config->dsss.upsampling_factor = 15;
+  config->dsss.baseband_decimation_factor = 3;
+}
+
+// A token as the decoder reported it.
+struct Heard {
+  std::vector<uint8_t> message;
+  double time_seconds;
+  bool operator==(const Heard& other) const {
+    return message == other.message && time_seconds == other.time_seconds;
+  }
+};
+
+// Takes the decoder's queued tokens and appends them to *heard.
+inline void TakeHeard(vesk_decoder* decoder, std::vector<Heard>* heard) {
+  const vesk_token* tokens = nullptr;
+  size_t count = 0;
+  ASSERT_EQ(vesk_decoder_take_tokens(decoder, &tokens, &count), VESK_OK);
+  for (size_t i = 0; i < count; ++i) {
+    heard->push_back(
+        {std::vector<uint8_t>(tokens[i].message, tokens[i].message + tokens[i].message_bytes),
+         tokens[i].time_seconds});
+  }
+}
+
 // What a loudspeaker plays: half a second of silence, the transition, the
 // token three times and a second of silence, as the encoder's PCM.
 inline std::vector<int16_t> Broadcast(const vesk_config& config,

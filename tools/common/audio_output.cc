@@ -43,7 +43,7 @@ sf_count_t FileWrite(const void* data, sf_count_t count, void* user) {
   MemoryFile* file = static_cast<MemoryFile*>(user);
   const size_t end = static_cast<size_t>(file->position + count);
   if (file->bytes.size() < end) file->bytes.resize(end);
-  std::memcpy(file->bytes.data() + file->position, data, static_cast<size_t>(count));
+  if (count > 0) std::memcpy(file->bytes.data() + file->position, data, static_cast<size_t>(count));
   file->position += count;
   return count;
 }

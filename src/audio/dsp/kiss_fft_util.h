@@ -13,7 +13,10 @@
 #define AUDIO_DSP_KISS_FFT_UTIL_H_
 
 #include <complex>
+#include <memory>
 #include <vector>
+
+#include "audio/dsp/kiss_fft.h"
 
 namespace audio_dsp {
 
@@ -55,6 +58,59 @@ void BandPassSpectrum(const std::vector<std::complex<float>>& input_spectrum, fl
 // would shrink to M = 0, gives an empty output. `output` may be &input.
 void FftResample(const std::vector<float>& input, float input_sample_rate, float output_sample_rate,
                  std::vector<float>* output);
+
+// FftResample for buffers of one length, planned once: the same output
+// (within float rounding), optionally with a band kept first as
+// BandPassFilter keeps it, for a buffer that is resampled again and again
+// (every token of an encoder). Instead of full transforms of both lengths,
+// which for lengths with large prime factors cost two Bluestein transforms
+// each, it computes with two chirp-z transforms only the bins the output
+// needs: the input's half spectrum up to the lower of the two Nyquist
+// frequencies, and the real output from that half spectrum. Both run on one
+// kissfft transform of a fast size (about 1.6 N) made at construction, with
+// their chirps and kernel spectra; each call allocates two work buffers of
+// that size. Const methods, thread-safe.
+class FftResampler {
+ public:
+  // Buffers of input_size (> 0) samples at input_sample_rate, to
+  // output_sample_rate (Hz, both > 0; fatal checks): output_size() =
+  // round(input_size x output rate / input rate) as FftResample computes it.
+  FftResampler(int input_size, float input_sample_rate, float output_sample_rate);
+  ~FftResampler();
+
+  int input_size() const { return input_size_; }
+  int output_size() const { return output_size_; }
+
+  // `input` holds input_size() samples; `output` (not &input) gets
+  // output_size() samples.
+  void Resample(const std::vector<float>& input, std::vector<float>* output) const;
+  // The same after keeping only the input frequencies in [low_band_edge,
+  // high_band_edge] (Hz), bin by bin as BandPassFilter does (fatal checks as
+  // there).
+  void BandPassAndResample(const std::vector<float>& input, float low_band_edge,
+                           float high_band_edge, std::vector<float>* output) const;
+
+ private:
+  // Bins [first_bin, end_bin) of the input's half spectrum kept.
+  void Run(const std::vector<float>& input, int first_bin, int end_bin,
+           std::vector<float>* output) const;
+
+  int input_size_;
+  int output_size_;
+  float input_sample_rate_;
+  int num_bins_;  // Half-spectrum bins carried over: min(N, M) / 2 + 1.
+  std::unique_ptr<ComplexFFTTransformer> inner_;
+  // Forward (input -> bins): the input's chirp, the kernel spectrum, and the
+  // bins' chirp with the inner inverse's 1 / L folded in.
+  std::vector<std::complex<float>> forward_input_chirp_;
+  std::vector<std::complex<float>> forward_kernel_spectrum_;
+  std::vector<std::complex<float>> forward_bin_chirp_;
+  // Inverse (bins -> output), likewise, the output's chirp also holding the
+  // final 1 / N.
+  std::vector<std::complex<float>> inverse_bin_chirp_;
+  std::vector<std::complex<float>> inverse_kernel_spectrum_;
+  std::vector<std::complex<float>> inverse_output_chirp_;
+};
 
 }  // namespace audio_dsp
 

@@ -1,8 +1,10 @@
 #include "audio/dsp/kiss_fft_util.h"
 
+#include <algorithm>
 #include <cmath>
 #include <complex>
 #include <initializer_list>
+#include <random>
 #include <utility>
 #include <vector>
 
@@ -84,6 +86,54 @@ TEST(FftResampleTest, LengthChanges) {
   EXPECT_EQ(out, signal);
   FftResample({}, 8000.0f, 16000.0f, &out);
   EXPECT_TRUE(out.empty());
+}
+
+// Largest |a - b| over two equally long buffers, relative to b's peak (or
+// to 1, the input's scale, when b is about silent).
+float LargestError(const std::vector<float>& a, const std::vector<float>& b) {
+  EXPECT_EQ(a.size(), b.size());
+  float peak = 0.0f, error = 0.0f;
+  for (size_t i = 0; i < std::min(a.size(), b.size()); ++i) {
+    peak = std::max(peak, std::fabs(b[i]));
+    error = std::max(error, std::fabs(a[i] - b[i]));
+  }
+  return error / std::max(peak, 1.0f);
+}
+
+// The planned resampler gives FftResample's output, and BandPassFilter's
+// followed by it, within float rounding: growing and shrinking, odd and even
+// lengths on either side, fast and Bluestein sizes, the same rate with a
+// band, a band edge on the Nyquist bin.
+TEST(FftResamplerTest, EqualsFftResampleAndBandPassFilter) {
+  struct Case {
+    int size;
+    float from, to;
+  };
+  std::mt19937 rng(2);
+  std::uniform_real_distribution<float> value(-1.0f, 1.0f);
+  for (const Case& c : {Case{32385, 44100, 48000}, Case{34544, 48000, 44100},
+                        Case{1024, 8000, 8000}, Case{1000, 16000, 8000}, Case{127, 8000, 16000},
+                        Case{128, 8000, 16000}, Case{4, 4, 8}, Case{2032, 48000, 48000}}) {
+    std::vector<float> input(c.size);
+    for (float& x : input) x = value(rng);
+    const FftResampler resampler(c.size, c.from, c.to);
+    std::vector<float> got, want;
+    if (c.from != c.to) {
+      resampler.Resample(input, &got);
+      FftResample(input, c.from, c.to, &want);
+      EXPECT_LT(LargestError(got, want), 2e-6f) << c.size;
+      EXPECT_EQ(resampler.output_size(), static_cast<int>(want.size()));
+    }
+    for (const std::pair<float, float>& band :
+         {std::make_pair(0.3f * c.from, 0.5f * c.from),
+          std::make_pair(0.1f * c.from, 0.2f * c.from), std::make_pair(0.0f, 0.5f * c.from)}) {
+      std::vector<float> filtered;
+      BandPassFilter(input, band.first, band.second, c.from, &filtered);
+      FftResample(filtered, c.from, c.to, &want);
+      resampler.BandPassAndResample(input, band.first, band.second, &got);
+      EXPECT_LT(LargestError(got, want), 2e-6f) << c.size << " " << band.first;
+    }
+  }
 }
 
 TEST(KissFftUtilDeathTest, ChecksArguments) {

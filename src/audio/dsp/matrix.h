@@ -83,7 +83,8 @@ using MatrixXf = Matrix<float>;
 using MatrixXcf = Matrix<std::complex<float>>;
 
 // result = matrix × vector; `vector` has matrix.cols() entries and `result`
-// gets matrix.rows() entries. `result` must not alias `vector`.
+// gets matrix.rows() entries. `result` must not alias `vector`. Each entry is
+// accumulated column by column, starting from zero.
 template <typename M, typename V, typename R>
 void MultiplyMatrixVector(const Matrix<M>& matrix, const V* vector, std::vector<R>* result) {
   CHECK(result);
@@ -95,6 +96,14 @@ void MultiplyMatrixVector(const Matrix<M>& matrix, const V* vector, std::vector<
     for (int r = 0; r < matrix.rows(); ++r) out[r] += column[r] * x;
   }
 }
+
+// The same for float and complex float, four floats of rows at a time: every
+// entry sees exactly the operations of the template above, in its order.
+void MultiplyMatrixVector(const Matrix<float>& matrix, const float* vector,
+                          std::vector<float>* result);
+void MultiplyMatrixVector(const Matrix<std::complex<float>>& matrix,
+                          const std::complex<float>* vector,
+                          std::vector<std::complex<float>>* result);
 
 }  // namespace audio_dsp
 

@@ -1,6 +1,7 @@
 #include "audio/dsp/matrix.h"
 
 #include <complex>
+#include <random>
 #include <vector>
 
 #include "gtest/gtest.h"
@@ -47,6 +48,39 @@ TEST(MatrixTest, RealMatrixTimesComplexVector) {
   MultiplyMatrixVector(m, x.data(), &y);
   ASSERT_EQ(y.size(), 1u);
   EXPECT_EQ(y[0], std::complex<float>(-1, 0));
+}
+
+// The float and complex products, four floats of rows at a time, give the
+// bits of the plain column-by-column template for every shape: rows that
+// fill whole vectors, passes of several vectors, and leftover rows.
+TEST(MatrixTest, VectorisedProductsEqualThePlainOnesBitForBit) {
+  std::mt19937 rng(3);
+  std::uniform_real_distribution<float> value(-10.0f, 10.0f);
+  for (int rows : {1, 2, 3, 4, 5, 8, 13, 16, 17, 29, 40}) {
+    for (int cols : {1, 3, 127}) {
+      MatrixXf real(rows, cols);
+      MatrixXcf complex(rows, cols);
+      std::vector<float> x(cols);
+      std::vector<std::complex<float>> z(cols);
+      for (int c = 0; c < cols; ++c) {
+        x[c] = value(rng);
+        z[c] = {value(rng), value(rng)};
+        for (int r = 0; r < rows; ++r) {
+          real(r, c) = value(rng);
+          complex(r, c) = {value(rng), value(rng)};
+        }
+      }
+      std::vector<float> fast, plain;
+      MultiplyMatrixVector(real, x.data(), &fast);
+      MultiplyMatrixVector<float, float, float>(real, x.data(), &plain);
+      EXPECT_EQ(fast, plain) << rows << " x " << cols;
+      std::vector<std::complex<float>> fast_z, plain_z;
+      MultiplyMatrixVector(complex, z.data(), &fast_z);
+      MultiplyMatrixVector<std::complex<float>, std::complex<float>, std::complex<float>>(
+          complex, z.data(), &plain_z);
+      EXPECT_EQ(fast_z, plain_z) << rows << " x " << cols;
+    }
+  }
 }
 
 }  // namespace

@@ -1,6 +1,7 @@
 #include "audio/dsp/pcm_conversion.h"
 
 #include <cstddef>
+#include <cstring>
 
 namespace audio_dsp {
 
@@ -25,6 +26,17 @@ std::vector<uint8_t> FloatsToPcm16Bytes(const std::vector<float>& samples) {
     bytes[2 * i + 1] = static_cast<uint8_t>(v >> 8);
   }
   return bytes;
+}
+
+void Pcm16ToFloats(const int16_t* pcm, int count, std::vector<float>* samples) {
+  samples->resize(count);
+  float* out = samples->data();
+  const unsigned char* bytes = reinterpret_cast<const unsigned char*>(pcm);
+  for (int i = 0; i < count; ++i) {
+    int16_t value;
+    std::memcpy(&value, bytes + 2 * static_cast<size_t>(i), sizeof(value));
+    out[i] = value;
+  }
 }
 
 }  // namespace audio_dsp

@@ -30,5 +30,13 @@ TEST(PcmConversionTest, BytesAreLittleEndian) {
   EXPECT_TRUE(FloatsToPcm16Bytes({}).empty());
 }
 
+TEST(PcmConversionTest, SixteenBitValuesBecomeUnscaledFloats) {
+  // Read from an odd address: no alignment is assumed.
+  const uint8_t bytes[] = {0x55, 0x00, 0x80, 0xFF, 0x7F, 0x01, 0x00, 0xFF, 0xFF};
+  std::vector<float> samples = {9, 9, 9, 9, 9, 9};
+  Pcm16ToFloats(reinterpret_cast<const int16_t*>(bytes + 1), 4, &samples);
+  EXPECT_EQ(samples, (std::vector<float>{-32768, 32767, 1, -1}));
+}
+
 }  // namespace
 }  // namespace audio_dsp

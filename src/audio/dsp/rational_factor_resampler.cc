@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "audio/dsp/number_util.h"
+#include "audio/dsp/simd.h"
 #include "base/logging.h"
 
 namespace audio_dsp {
@@ -16,16 +17,6 @@ namespace {
 // Rate ratios beyond this are rejected before the fraction is formed; the
 // approximation works in 32-bit ints and the tables would be absurd anyway.
 constexpr double kMaxRatio = 65536.0;
-
-// Four-lane float vectors (GCC/Clang vector extension; SSE on x86, NEON on
-// ARM, plain scalar code elsewhere).
-typedef float Float4 __attribute__((vector_size(16)));
-
-inline Float4 Load4(const float* p) {
-  Float4 v;
-  std::memcpy(&v, p, sizeof(v));  // unaligned load
-  return v;
-}
 
 // Sum of a[m] * b[m] over m < n in single precision, as eight partial sums
 // held in two four-lane accumulators, returned lane by lane (lanes 4 to 7 are

@@ -5,6 +5,8 @@
 #include <complex>
 
 #include "audio/dsp/matrix.h"
+#include "audio/dsp/number_util.h"
+#include "audio/dsp/simd.h"
 #include "audio/vesknet/vesknet_util.h"
 #include "base/logging.h"
 
@@ -18,7 +20,30 @@ int HistorySize(int delay, int span, int warm_up) {
   return std::max(std::max(delay + 1, span), warm_up);
 }
 
+// Shifts per history row: a multiple of the sixteen summed per vector.
+int RowStride(int num_shifts) { return (num_shifts + 15) / 16 * 16; }
+
+int DetectionSpan(int frame_size, int detection_window) {
+  return std::max(2 * frame_size - 1, detection_window);
+}
+
+// The background smoother: two cascaded one-pole stages whose impulse
+// response has the spread of a box of noise_length positions.
+double NoisePole(float noise_length) {
+  const double q = static_cast<double>(noise_length) * noise_length / 24.0;
+  return 1.0 + (1.0 - std::sqrt(2.0 * q + 1.0)) / q;
+}
+int NoiseDelay(double pole) { return static_cast<int>(std::round(2.0 * pole / (1.0 - pole))); }
+
 }  // namespace
+
+int64_t AcquisitionScorer::HistoryFloats(int frame_size, int num_shifts, float noise_length,
+                                         int detection_window) {
+  const int delay = NoiseDelay(NoisePole(noise_length));
+  const int history = static_cast<int>(audio_dsp::NextPowerOfTwo(static_cast<unsigned>(
+      HistorySize(delay, DetectionSpan(frame_size, detection_window), std::max(delay, 10)))));
+  return static_cast<int64_t>(history) * RowStride(num_shifts);
+}
 
 AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
                                      const std::vector<float>& doppler_shifts, int num_chunks,
@@ -27,11 +52,12 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
       num_shifts_(static_cast<int>(doppler_shifts.size())),
       num_chunks_(num_chunks),
       reference_(reference),
-      history_(1) {
+      best_energy_(1) {
   CHECK(num_chunks_ > 0);
   CHECK(frame_size_ > 0);
   CHECK(num_shifts_ > 0);
   chunk_length_ = (frame_size_ + num_chunks_ - 1) / num_chunks_;
+  row_stride_ = RowStride(num_shifts_);
 
   // MakePhasorMatrix builds shifts x chunks; row s is this shift's phasor
   // over the chunks.
@@ -45,65 +71,89 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
       phasor_imag_[s * num_chunks_ + k] = phasors(s, k).imag();
     }
   }
+  // Pair each shift with its mirror: the phasors of -f are computed with the
+  // same operations as those of f, up to signs, so they are exact conjugates.
+  std::vector<bool> paired(num_shifts_, false);
+  for (int s = 0; s < num_shifts_; ++s) {
+    if (paired[s]) continue;
+    paired[s] = true;
+    int mirror = -1;
+    for (int t = s + 1; t < num_shifts_ && mirror < 0; ++t) {
+      if (paired[t]) continue;
+      bool conjugate = true;
+      for (int k = 0; k < num_chunks_ && conjugate; ++k) {
+        conjugate = phasor_real_[t * num_chunks_ + k] == phasor_real_[s * num_chunks_ + k] &&
+                    phasor_imag_[t * num_chunks_ + k] == -phasor_imag_[s * num_chunks_ + k];
+      }
+      if (conjugate) mirror = t;
+    }
+    if (mirror >= 0) paired[mirror] = true;
+    terms_.push_back({s, mirror});
+  }
+  term_phasors_.resize(terms_.size() * num_chunks_ * 8);
+  for (size_t t = 0; t < terms_.size(); ++t) {
+    for (int k = 0; k < num_chunks_; ++k) {
+      float* phasor = term_phasors_.data() + (t * num_chunks_ + k) * 8;
+      std::fill(phasor, phasor + 4, phasor_real_[terms_[t].shift * num_chunks_ + k]);
+      std::fill(phasor + 4, phasor + 8, phasor_imag_[terms_[t].shift * num_chunks_ + k]);
+    }
+  }
 
-  detection_span_ = std::max(2 * frame_size_ - 1, detection_window);
+  detection_span_ = DetectionSpan(frame_size_, detection_window);
   detection_num_frames_ = (detection_span_ + 1 - frame_size_) / frame_size_;
   CHECK(detection_num_frames_ >= 1);
   detection_num_shifts_ = detection_span_ + 1 - frame_size_ * detection_num_frames_;
   CHECK(detection_num_shifts_ >= frame_size_);
 
-  // Two cascaded one-pole stages whose impulse response has the spread of a
-  // box of noise_length positions.
   CHECK(noise_length > 0.0f);
-  const double q = static_cast<double>(noise_length) * noise_length / 24.0;
-  const double pole = 1.0 + (1.0 - std::sqrt(2.0 * q + 1.0)) / q;
+  const double pole = NoisePole(noise_length);
   noise_weight_ = 1.0 - pole;
-  noise_delay_ = static_cast<int>(std::round(2.0 * pole / (1.0 - pole)));
+  noise_delay_ = NoiseDelay(pole);
   warm_up_ = std::max(noise_delay_, 10);
 
-  history_ =
-      CircularArray<std::vector<float>>(HistorySize(noise_delay_, detection_span_, warm_up_));
-  history_.Fill(std::vector<float>(num_shifts_, 0.0f));
-  chunk_real_.resize(num_chunks_);
-  chunk_imag_.resize(num_chunks_);
+  const int history = static_cast<int>(audio_dsp::NextPowerOfTwo(
+      static_cast<unsigned>(HistorySize(noise_delay_, detection_span_, warm_up_))));
+  energies_.resize(static_cast<size_t>(history) * row_stride_);
+  energies_mask_ = history - 1;
+  best_energy_ = CircularArray<float>(noise_delay_ + 1);
+  chunk_real_.resize(num_chunks_ * kLanes);
+  chunk_imag_.resize(num_chunks_ * kLanes);
+  block_energies_.resize(num_shifts_ * kLanes);
   Reset();
 }
 
 void AcquisitionScorer::Reset() {
-  reader_real_.clear();
-  reader_imag_.clear();
-  read_position_ = 0;
+  buffered_ = 0;
+  reader_real_.assign(kLanes - 1, 0.0f);
+  reader_imag_.assign(kLanes - 1, 0.0f);
   noise_state1_ = 0.0;
   noise_state2_ = 0.0;
   positions_scored_ = 0;
-  history_.Fill(std::vector<float>(num_shifts_, 0.0f));
+  std::fill(energies_.begin(), energies_.end(), 0.0f);
 }
 
 void AcquisitionScorer::ScorePointers(const float* real, const float* imag,
                                       float* shift_scores) const {
   const float* reference = reference_.data();
+  std::vector<float> chunk_real(num_chunks_), chunk_imag(num_chunks_);
   for (int k = 0; k < num_chunks_; ++k) {
     const int begin = std::min(k * chunk_length_, frame_size_);
     const int end = std::min(begin + chunk_length_, frame_size_);
     float sum_real = 0.0f, sum_imag = 0.0f;
-#pragma omp simd reduction(+ : sum_real, sum_imag)
     for (int n = begin; n < end; ++n) {
       sum_real += real[n] * reference[n];
       sum_imag += imag[n] * reference[n];
     }
-    chunk_real_[k] = sum_real;
-    chunk_imag_[k] = sum_imag;
+    chunk_real[k] = sum_real;
+    chunk_imag[k] = sum_imag;
   }
-  const float* cr = chunk_real_.data();
-  const float* ci = chunk_imag_.data();
   for (int s = 0; s < num_shifts_; ++s) {
     const float* pr = phasor_real_.data() + s * num_chunks_;
     const float* pi = phasor_imag_.data() + s * num_chunks_;
     float y_real = 0.0f, y_imag = 0.0f;
-#pragma omp simd reduction(+ : y_real, y_imag)
     for (int k = 0; k < num_chunks_; ++k) {
-      y_real += pr[k] * cr[k] - pi[k] * ci[k];
-      y_imag += pr[k] * ci[k] + pi[k] * cr[k];
+      y_real += pr[k] * chunk_real[k] - pi[k] * chunk_imag[k];
+      y_imag += pr[k] * chunk_imag[k] + pi[k] * chunk_real[k];
     }
     // Energies, not magnitudes: every later comparison is on energies.
     shift_scores[s] = y_real * y_real + y_imag * y_imag;
@@ -120,23 +170,102 @@ void AcquisitionScorer::ScoreFrame(const std::vector<float>& baseband_frame_real
   ScorePointers(baseband_frame_real.data(), baseband_frame_imaginary.data(), shift_scores->data());
 }
 
-void AcquisitionScorer::ScorePosition(std::vector<float>* acquisition_scores) {
-  const int64_t n = positions_scored_;
-  std::vector<float>& scores = history_[n];
-  ScorePointers(reader_real_.data() + read_position_, reader_imag_.data() + read_position_,
-                scores.data());
+void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int count) {
+  using audio_dsp::Float4;
+  using audio_dsp::Load4;
+  using audio_dsp::Store4;
+  // Chunk correlations of the kLanes positions: lane p of every vector
+  // belongs to the frame starting p samples on, so one pass over the
+  // reference serves all of them and no sum crosses lanes.
+  const float* reference = reference_.data();
+  for (int k = 0; k < num_chunks_; ++k) {
+    const int begin = std::min(k * chunk_length_, frame_size_);
+    const int end = std::min(begin + chunk_length_, frame_size_);
+    Float4 real0 = {}, real1 = {}, real2 = {}, imag0 = {}, imag1 = {}, imag2 = {};
+    for (int n = begin; n < end; ++n) {
+      const float r = reference[n];
+      real0 += Load4(real + n) * r;
+      real1 += Load4(real + n + 4) * r;
+      real2 += Load4(real + n + 8) * r;
+      imag0 += Load4(imag + n) * r;
+      imag1 += Load4(imag + n + 4) * r;
+      imag2 += Load4(imag + n + 8) * r;
+    }
+    float* chunk_real = chunk_real_.data() + k * kLanes;
+    float* chunk_imag = chunk_imag_.data() + k * kLanes;
+    Store4(chunk_real, real0);
+    Store4(chunk_real + 4, real1);
+    Store4(chunk_real + 8, real2);
+    Store4(chunk_imag, imag0);
+    Store4(chunk_imag + 4, imag1);
+    Store4(chunk_imag + 8, imag2);
+  }
 
+  // Shift energies, four lanes at a time. With the phasor (c, d) of shift f
+  // at chunk k and the chunk correlation (x, y):
+  //   shift  f: (sum cx - dy)^2 + (sum cy + dx)^2,
+  //   shift -f: (sum cx + dy)^2 + (sum cy - dx)^2.
+  for (int half = 0; half < kLanes; half += 4) {
+    const float* cr = chunk_real_.data() + half;
+    const float* ci = chunk_imag_.data() + half;
+    const float* phasors = term_phasors_.data();
+    for (const ShiftTerm& term : terms_) {
+      Float4 cx = {}, dy = {}, cy = {}, dx = {};
+      for (int k = 0; k < num_chunks_; ++k, phasors += 8) {
+        const Float4 x = Load4(cr + k * kLanes);
+        const Float4 y = Load4(ci + k * kLanes);
+        const Float4 c = Load4(phasors);
+        const Float4 d = Load4(phasors + 4);
+        cx += x * c;
+        dy += y * d;
+        cy += y * c;
+        dx += x * d;
+      }
+      const Float4 re = cx - dy, im = cy + dx;
+      Store4(block_energies_.data() + term.shift * kLanes + half, re * re + im * im);
+      if (term.mirror >= 0) {
+        const Float4 mirror_re = cx + dy, mirror_im = cy - dx;
+        Store4(block_energies_.data() + term.mirror * kLanes + half,
+               mirror_re * mirror_re + mirror_im * mirror_im);
+      }
+    }
+  }
+  // Each lane's largest energy and energy sum (in double, shift by shift,
+  // as the background's mean is defined).
+  for (int lane = 0; lane < kLanes; ++lane) block_sum_[lane] = 0.0;
+  for (int group = 0; group < kLanes; group += 4) {
+    Float4 best = Load4(block_energies_.data() + group);
+    for (int s = 1; s < num_shifts_; ++s) {
+      const Float4 energies = Load4(block_energies_.data() + s * kLanes + group);
+      best = energies > best ? energies : best;
+    }
+    Store4(block_best_ + group, best);
+  }
+  for (int s = 0; s < num_shifts_; ++s) {
+    const float* energies = block_energies_.data() + s * kLanes;
+    for (int lane = 0; lane < kLanes; ++lane) block_sum_[lane] += energies[lane];
+  }
+  // Only the positions asked for: the others' slots may still hold history.
+  for (int lane = 0; lane < count; ++lane) {
+    float* energies = Energies(positions_scored_ + lane);
+    for (int s = 0; s < num_shifts_; ++s) energies[s] = block_energies_[s * kLanes + lane];
+  }
+}
+
+void AcquisitionScorer::FinishPosition(float best, double sum,
+                                       std::vector<float>* acquisition_scores) {
+  const int64_t n = positions_scored_;
+  best_energy_[n] = best;
   if (n == warm_up_ - 1) {
     // Start the background at the mean of the first positions rather than
     // at zero, so that early scores are not inflated.
-    double sum = 0.0;
+    double warm_sum = 0.0;
     for (int64_t p = 0; p < warm_up_; ++p) {
-      for (float v : history_[p]) sum += v;
+      const float* energies = Energies(p);
+      for (int s = 0; s < num_shifts_; ++s) warm_sum += energies[s];
     }
-    noise_state1_ = noise_state2_ = sum / (static_cast<double>(warm_up_) * num_shifts_);
+    noise_state1_ = noise_state2_ = warm_sum / (static_cast<double>(warm_up_) * num_shifts_);
   } else if (n > warm_up_ - 1) {
-    double sum = 0.0;
-    for (float v : scores) sum += v;
     const double mean = sum / num_shifts_;
     noise_state1_ += noise_weight_ * (mean - noise_state1_);
     noise_state2_ += noise_weight_ * (noise_state1_ - noise_state2_);
@@ -146,9 +275,7 @@ void AcquisitionScorer::ScorePosition(std::vector<float>* acquisition_scores) {
   if (positions_scored_ > noise_delay_) {
     float output = 0.0f;
     if (n >= warm_up_ - 1) {
-      const std::vector<float>& delayed = history_[n - noise_delay_];
-      const float best = *std::max_element(delayed.begin(), delayed.end());
-      output = static_cast<float>(best / (noise_state2_ + 1e-12));
+      output = static_cast<float>(best_energy_[n - noise_delay_] / (noise_state2_ + 1e-12));
     }
     acquisition_scores->push_back(output);
   }
@@ -162,43 +289,77 @@ void AcquisitionScorer::ComputeScores(const std::vector<float>& baseband_real_si
                  << baseband_imaginary_signal.size();
   }
   CHECK(baseband_real_signal.size() == baseband_imaginary_signal.size());
+  ComputeScores(baseband_real_signal.data(), baseband_imaginary_signal.data(),
+                static_cast<int>(baseband_real_signal.size()), acquisition_scores);
+}
+
+void AcquisitionScorer::ComputeScores(const float* baseband_real_signal,
+                                      const float* baseband_imaginary_signal, int count,
+                                      std::vector<float>* acquisition_scores) {
   CHECK(acquisition_scores);
   acquisition_scores->clear();
+  if (count <= 0) return;
 
   // The readers keep the unconsumed samples; a position is scored once a
-  // whole frame beyond it has arrived. Consumed samples are discarded in
-  // bulk, so each sample is moved about once.
-  reader_real_.insert(reader_real_.end(), baseband_real_signal.begin(), baseband_real_signal.end());
-  reader_imag_.insert(reader_imag_.end(), baseband_imaginary_signal.begin(),
-                      baseband_imaginary_signal.end());
-  const int available = static_cast<int>(reader_real_.size());
-  while (available - read_position_ >= frame_size_) {
-    ScorePosition(acquisition_scores);
-    ++read_position_;
+  // whole frame beyond it has arrived. The zeros behind the samples are read
+  // only by lanes of a last block that stand for no position.
+  const int total = buffered_ + count;
+  reader_real_.resize(total + kLanes - 1);
+  reader_imag_.resize(total + kLanes - 1);
+  std::copy(baseband_real_signal, baseband_real_signal + count, reader_real_.begin() + buffered_);
+  std::copy(baseband_imaginary_signal, baseband_imaginary_signal + count,
+            reader_imag_.begin() + buffered_);
+  std::fill(reader_real_.begin() + total, reader_real_.end(), 0.0f);
+  std::fill(reader_imag_.begin() + total, reader_imag_.end(), 0.0f);
+
+  const int positions = std::max(0, total - frame_size_ + 1);
+  for (int start = 0; start < positions; start += kLanes) {
+    const int lanes = std::min(kLanes, positions - start);
+    ScoreBlock(reader_real_.data() + start, reader_imag_.data() + start, lanes);
+    for (int lane = 0; lane < lanes; ++lane) {
+      FinishPosition(block_best_[lane], block_sum_[lane], acquisition_scores);
+    }
   }
-  if (read_position_ > 0) {
-    reader_real_.erase(reader_real_.begin(), reader_real_.begin() + read_position_);
-    reader_imag_.erase(reader_imag_.begin(), reader_imag_.begin() + read_position_);
-    read_position_ = 0;
+  // Consumed samples go in bulk, so each sample is moved about once.
+  if (positions > 0) {
+    std::copy(reader_real_.begin() + positions, reader_real_.begin() + total, reader_real_.begin());
+    std::copy(reader_imag_.begin() + positions, reader_imag_.begin() + total, reader_imag_.begin());
   }
+  buffered_ = total - positions;
+  std::fill(reader_real_.begin() + buffered_, reader_real_.begin() + buffered_ + kLanes - 1, 0.0f);
+  std::fill(reader_imag_.begin() + buffered_, reader_imag_.begin() + buffered_ + kLanes - 1, 0.0f);
 }
 
 float AcquisitionScorer::GetBroadcasterScore(bool normalize) const {
+  using audio_dsp::Float4;
+  using audio_dsp::Load4;
   if (frame_size_ + positions_scored_ <= detection_span_) return 0.0f;
+  // Lag l integrates the energies at latest - 1 - l, one frame earlier, and
+  // so on, newest first, sixteen shifts at a time (in single precision: a
+  // window of a few dozen frames).
   const int64_t latest = positions_scored_;
-  std::vector<double> summed(num_shifts_);
   double best = 0.0;
   double total = 0.0;
   for (int lag = 0; lag < detection_num_shifts_; ++lag) {
-    std::fill(summed.begin(), summed.end(), 0.0);
-    for (int frame = 0; frame < detection_num_frames_; ++frame) {
-      const std::vector<float>& scores =
-          history_[latest - 1 - lag - static_cast<int64_t>(frame) * frame_size_];
-      for (int s = 0; s < num_shifts_; ++s) summed[s] += scores[s];
-    }
-    for (int s = 0; s < num_shifts_; ++s) {
-      best = std::max(best, summed[s]);
-      total += summed[s];
+    for (int first = 0; first < row_stride_; first += 16) {
+      Float4 sum0 = {}, sum1 = {}, sum2 = {}, sum3 = {};
+      for (int frame = 0; frame < detection_num_frames_; ++frame) {
+        const float* energies =
+            Energies(latest - 1 - lag - static_cast<int64_t>(frame) * frame_size_) + first;
+        sum0 += Load4(energies);
+        sum1 += Load4(energies + 4);
+        sum2 += Load4(energies + 8);
+        sum3 += Load4(energies + 12);
+      }
+      float sums[16];
+      audio_dsp::Store4(sums, sum0);
+      audio_dsp::Store4(sums + 4, sum1);
+      audio_dsp::Store4(sums + 8, sum2);
+      audio_dsp::Store4(sums + 12, sum3);
+      for (int s = 0; s < std::min(16, num_shifts_ - first); ++s) {
+        best = std::max(best, static_cast<double>(sums[s]));
+        total += sums[s];
+      }
     }
   }
   if (!normalize) return static_cast<float>(best);

@@ -11,7 +11,16 @@
 // stages); the output stream runs D positions behind the input, D being the
 // smoother's group delay, and output i always belongs to position i.
 //
-// Not thread-safe. Allocates at construction and when inputs grow.
+// Cost: per position, one pass over the frame (F multiply-adds per part) for
+// twelve positions at a time, their chunk correlations held in four-lane
+// vectors whose lanes are positions, and one pass over the chunks per pair of
+// opposite shifts (a shift and its mirror share their products). The
+// broadcaster score costs nothing per position; a request adds up the
+// detection window's energies, four shifts per vector.
+//
+// Not thread-safe. Allocates at construction and when an input block is
+// larger than every earlier one; otherwise ComputeScores does not allocate
+// (the output vector keeps its capacity).
 
 #ifndef AUDIO_VESKNET_ACQUISITION_SCORER_H_
 #define AUDIO_VESKNET_ACQUISITION_SCORER_H_
@@ -25,6 +34,12 @@ namespace audio_vesknet {
 
 class AcquisitionScorer {
  public:
+  // Floats of energy history that a scorer of these arguments keeps (the
+  // bulk of its memory), without building it. Arguments as the constructor's;
+  // frame_size F > 0, num_shifts S > 0.
+  static int64_t HistoryFloats(int frame_size, int num_shifts, float noise_length,
+                               int detection_window);
+
   // reference: the code at the baseband rate (F samples, the frame).
   // doppler_shifts: shifts in cycles per frame (S values).
   // num_chunks: C > 0.
@@ -39,16 +54,22 @@ class AcquisitionScorer {
 
   // Takes in newly arrived baseband samples (equal lengths) and replaces
   // *acquisition_scores with one score per newly completed output position.
+  // The scores do not depend on how the stream is cut into blocks.
   void ComputeScores(const std::vector<float>& baseband_real_signal,
                      const std::vector<float>& baseband_imaginary_signal,
                      std::vector<float>* acquisition_scores);
+  // The same for `count` samples of each part.
+  void ComputeScores(const float* baseband_real_signal, const float* baseband_imaginary_signal,
+                     int count, std::vector<float>* acquisition_scores);
 
   // How clearly a code frame repeats with the frame period over the last
   // detection window: the largest frame-integrated shift energy, normalised
   // (when asked) by the average. 0 until a whole window has been scored.
   float GetBroadcasterScore(bool normalize) const;
 
-  // The S shift energies of one frame of exactly F samples.
+  // The S shift energies of one frame of exactly F samples, computed directly
+  // (chunk by chunk, then shift by shift): the definition that the streaming
+  // scores follow within float rounding.
   void ScoreFrame(const std::vector<float>& baseband_frame_real,
                   const std::vector<float>& baseband_frame_imaginary,
                   std::vector<float>* shift_scores) const;
@@ -63,19 +84,52 @@ class AcquisitionScorer {
   int64_t positions_scored() const { return positions_scored_; }
 
  private:
-  // Shift energies of the frame at real[0 .. F), imag[0 .. F).
+  // Positions scored together, one per vector lane (three four-lane vectors
+  // per part: with their accumulators, the reference value and a load they
+  // fill the eight vector registers of 32-bit x86).
+  static constexpr int kLanes = 12;
+
+  // A Doppler shift, and the shift whose phasors are its exact conjugates
+  // (-1 when the list has none): the two energies come from the same four
+  // chunk-phasor products.
+  struct ShiftTerm {
+    int shift;
+    int mirror;
+  };
+
+  // Shift energies of the frame at real[0 .. F), imag[0 .. F), directly.
   void ScorePointers(const float* real, const float* imag, float* shift_scores) const;
-  // Scores the position at the readers' read position and emits its output.
-  void ScorePosition(std::vector<float>* acquisition_scores);
+  // Shift energies of the `count` (<= kLanes) positions starting at `real`
+  // and `imag` into the history, for the positions from positions_scored_
+  // on, with each one's largest energy and its energies' sum into
+  // block_best_ and block_sum_. Reads kLanes - 1 + F samples of each part
+  // whatever the count.
+  void ScoreBlock(const float* real, const float* imag, int count);
+  // Background and output of the next position, whose largest energy and
+  // energy sum are given; counts the position.
+  void FinishPosition(float best, double sum, std::vector<float>* acquisition_scores);
+  // The S energies of `position` in the history (row_stride_ floats, the
+  // ones beyond S being 0).
+  float* Energies(int64_t position) {
+    return energies_.data() + (position & energies_mask_) * row_stride_;
+  }
+  const float* Energies(int64_t position) const {
+    return energies_.data() + (position & energies_mask_) * row_stride_;
+  }
 
   int frame_size_;
   int num_shifts_;
   int num_chunks_;
   int chunk_length_;
+  int row_stride_;  // S rounded up to a multiple of 16.
   std::vector<float> reference_;
   // Phasor of shift s at chunk k: (phasor_real_, phasor_imag_)[s * C + k].
   std::vector<float> phasor_real_;
   std::vector<float> phasor_imag_;
+  std::vector<ShiftTerm> terms_;
+  // The phasors of terms_[t] at chunk k, each four times (real, then
+  // imaginary): 8 floats at (t * C + k) * 8.
+  std::vector<float> term_phasors_;
   int detection_span_;
   int detection_num_frames_;
   int detection_num_shifts_;
@@ -84,15 +138,27 @@ class AcquisitionScorer {
   int warm_up_;
 
   // Streaming state.
+  // Samples not yet consumed, [0, buffered_), followed by kLanes - 1 zeros
+  // that a last, partial block reads.
   std::vector<float> reader_real_;
   std::vector<float> reader_imag_;
-  int read_position_ = 0;
+  int buffered_ = 0;
   double noise_state1_ = 0.0;
   double noise_state2_ = 0.0;
-  CircularArray<std::vector<float>> history_;
+  // Shift energies of the positions held, ring-indexed by position AND
+  // energies_mask_ (the capacity covers the detection span).
+  std::vector<float> energies_;
+  int64_t energies_mask_;
+  // Each position's largest energy, for its output D positions later.
+  CircularArray<float> best_energy_;
   int64_t positions_scored_ = 0;
-  mutable std::vector<float> chunk_real_;
-  mutable std::vector<float> chunk_imag_;
+  // Per-block scratch: chunk correlations (C x kLanes, lanes innermost),
+  // energies (S x kLanes) and each lane's largest energy and energy sum.
+  std::vector<float> chunk_real_;
+  std::vector<float> chunk_imag_;
+  std::vector<float> block_energies_;
+  float block_best_[kLanes];
+  double block_sum_[kLanes];
 };
 
 }  // namespace audio_vesknet

@@ -25,6 +25,7 @@ class StreamBuffer {
   int64_t dropped() const { return dropped_; }
 
   const T* data() const { return buffer_.storage.data() + buffer_.begin; }
+  T* mutable_data() { return buffer_.storage.data() + buffer_.begin; }
   const T& operator[](int index) const { return data()[index]; }
 
   void Append(const T* samples, int count) {
@@ -33,6 +34,8 @@ class StreamBuffer {
   void Append(const std::vector<T>& samples) {
     Append(samples.data(), static_cast<int>(samples.size()));
   }
+  // Appends `count` value-initialised elements.
+  void AppendZeros(int count) { buffer_.storage.resize(buffer_.storage.size() + count); }
 
   // Drops the `num_samples` oldest samples; 0 <= num_samples <= size().
   void DropOldest(int num_samples) {

@@ -47,10 +47,8 @@ SymbolWaveCoder::SymbolWaveCoder(const SymbolWaveCoderParams& params) : params_(
   const int code_length = static_cast<int>(params_.code_signal.size());
   alphabet_size_ = (1 << params_.bits_per_symbol) + 1;
   frame_size_ = code_length * params_.upsampling_factor;
-  // Single precision, product first, as the transmitters in the field do:
-  // both ends must agree on this integer.
-  const float carrier_product = static_cast<float>(frame_size_) * params_.desired_carrier_frequency;
-  carrier_cycles_per_frame_ = static_cast<int>(std::floor(carrier_product / params_.sample_rate));
+  carrier_cycles_per_frame_ =
+      CarrierCyclesPerFrame(frame_size_, params_.sample_rate, params_.desired_carrier_frequency);
   VLOG(1) << "CCPF: " << carrier_cycles_per_frame_;
   CHECK(carrier_cycles_per_frame_ >= 0);
 
@@ -91,6 +89,14 @@ SymbolWaveCoder::SymbolWaveCoder(const SymbolWaveCoderParams& params) : params_(
   for (std::vector<float>& wave : symbol_waves_) {
     for (float& sample : wave) sample = static_cast<float>(sample * scale);
   }
+}
+
+int SymbolWaveCoder::CarrierCyclesPerFrame(int frame_size, float sample_rate,
+                                           float desired_carrier_frequency) {
+  // Single precision, product first, as the transmitters in the field do:
+  // both ends must agree on this integer.
+  const float carrier_product = static_cast<float>(frame_size) * desired_carrier_frequency;
+  return static_cast<int>(std::floor(carrier_product / sample_rate));
 }
 
 const std::vector<float>& SymbolWaveCoder::GetSymbolWave(int symbol) const {

@@ -55,6 +55,10 @@ class SymbolWaveCoder {
   // Code length x upsampling_factor: passband samples per symbol.
   int frame_size() const { return frame_size_; }
   int carrier_cycles_per_frame() const { return carrier_cycles_per_frame_; }
+  // What carrier_cycles_per_frame() is for a coder of `frame_size` samples at
+  // `sample_rate` asked for `desired_carrier_frequency`, without building it.
+  static int CarrierCyclesPerFrame(int frame_size, float sample_rate,
+                                   float desired_carrier_frequency);
   // Carrier actually used, Hz: carrier_cycles_per_frame x sample_rate / frame_size.
   float carrier_frequency() const;
   // 2^bits_per_symbol + 1.

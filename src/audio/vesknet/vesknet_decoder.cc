@@ -2,13 +2,13 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstring>
 #include <utility>
 
-#include "audio/dsp/box_filter.h"
 #include "audio/dsp/number_util.h"
 #include "audio/dsp/resampling_kernel.h"
-#include "audio/vesknet/compute_buffer_truncation.h"
-#include "audio/vesknet/decoding_group.h"
+#include "audio/dsp/simd.h"
+#include "audio/vesknet/stream_intake.h"
 #include "audio/vesknet/vesknet_util.h"
 #include "base/logging.h"
 
@@ -62,8 +62,7 @@ VesknetDecoder::VesknetDecoder(const SymbolWaveCoder* symbol_wave_coder,
   baseband_filter_ = std::make_unique<audio_dsp::StreamingFirFilter>(baseband_filter_taps_);
 
   // The largest Doppler shift, in carrier cycles per frame.
-  const float max_shift =
-      static_cast<float>(coder_->carrier_cycles_per_frame() * params_.max_speed / kSpeedOfSound);
+  const float max_shift = MaxDopplerShift(coder_->carrier_cycles_per_frame(), params_);
   MakeFrequencyOffsets(params_.acquisition_doppler_step, max_shift, &acquisition_shifts_);
   scorer_ = std::make_unique<AcquisitionScorer>(
       coder_->baseband_code(), acquisition_shifts_, params_.acquisition_num_chunks,
@@ -85,10 +84,17 @@ VesknetDecoder::VesknetDecoder(const SymbolWaveCoder* symbol_wave_coder,
   // The code continues periodically into both extensions.
   CircularPad(coder_->baseband_code(), left_extension_,
               extended_size_ - frame_size_ - left_extension_, &symbol_reference_);
+  despread_gain_.resize(extended_size_);
+  for (int n = 0; n < extended_size_; ++n) {
+    despread_gain_[n] = symbol_reference_[n] * frame_window_[n];
+  }
 
   MakeFrequencyOffsets(params_.decode_doppler_step, max_shift, &decode_shifts_);
   MakePhasorMatrix(-2.0 * M_PI * chunk_length_ / frame_size_, decode_shifts_,
                    extended_size_ / chunk_length_, &decode_phasors_);
+  // Box sums are not normalised.
+  score_threshold_ =
+      params_.score_filter_length * params_.score_filter_count * params_.score_threshold_factor;
 }
 
 VesknetDecoder::VesknetDecoder(std::unique_ptr<const SymbolWaveCoder> symbol_wave_coder,
@@ -98,6 +104,11 @@ VesknetDecoder::VesknetDecoder(std::unique_ptr<const SymbolWaveCoder> symbol_wav
 }
 
 VesknetDecoder::~VesknetDecoder() = default;
+
+float VesknetDecoder::MaxDopplerShift(int carrier_cycles_per_frame,
+                                      const VesknetDecoderParams& params) {
+  return static_cast<float>(carrier_cycles_per_frame * params.max_speed / kSpeedOfSound);
+}
 
 int VesknetDecoder::TokenPeriodFrames() const {
   return params_.symbols_in_token + (params_.use_checksum_symbol ? 1 : 0) + 1;
@@ -127,6 +138,9 @@ void VesknetDecoder::Initialize(float sample_rate, int num_channels) {
   scores_.Clear();
   scorer_->Reset();
   frame_cache_.clear();
+  smoothed_.Clear();
+  smoothed_stale_ = 0;
+  smoothed_stale_head_ = 0;
   samples_received_ = 0;
   unscored_ = 0;
   initialized_ = true;
@@ -147,67 +161,88 @@ void VesknetDecoder::ProcessSamples(const std::vector<float>& received_samples) 
   }
   const int count = static_cast<int>(received_samples.size());
   if (count == 0) return;
-  int32_t frames_to_skip = 0, frames_to_drop = 0;
-  ComputeBufferTruncation(count / num_channels_, buffered_input_frames(), token_size_,
-                          max_buffer_size_, &frames_to_skip, &frames_to_drop);
-  if (frames_to_skip * num_channels_ >= 1) {
-    // The block alone overruns the buffer: start afresh on its tail.
-    Initialize(received_rate_, num_channels_);
-    ProcessSamples(std::vector<float>(
-        received_samples.begin() + static_cast<int64_t>(frames_to_skip) * num_channels_,
-        received_samples.end()));
-    return;
-  }
-  if (frames_to_drop > 0) DropHistory(frames_to_drop);
+  const int first = static_cast<int>(AdmitBlock(
+      count, num_channels_, token_size_, max_buffer_size_,
+      [this] { return buffered_input_frames(); },
+      [this] { Initialize(received_rate_, num_channels_); },
+      [this](int frames) { DropHistory(frames); }));
+  if (first == count) return;
 
   // Mono: the plain sum of the channels, not their mean.
-  const float* mono = received_samples.data();
-  int mono_count = count;
+  const float* mono = received_samples.data() + first;
+  int mono_count = count - first;
   if (num_channels_ > 1) {
     CHECK(received_samples.size() % num_channels_ == 0);
-    mono_count = count / num_channels_;
-    mono_.resize(mono_count);
-    for (int i = 0; i < mono_count; ++i) {
-      float sum = 0.0f;
-      for (int c = 0; c < num_channels_; ++c) sum += received_samples[i * num_channels_ + c];
-      mono_[i] = sum;
-    }
+    mono_count /= num_channels_;
+    DownmixChannels(mono, mono_count, num_channels_, 1.0f, &mono_);
     mono = mono_.data();
   }
+  if (params_.save_received_samples) SaveReceivedSamples(mono, mono_count);
+  AppendBaseband(mono, mono_count);
+  ScoreNewPositions();
+}
 
-  if (params_.save_received_samples) {
-    received_history_.Append(mono, mono_count);
-    const int keep = static_cast<int>(std::round(kSavedSeconds * received_rate_));
-    if (received_history_.size() > keep)
-      received_history_.DropOldest(received_history_.size() - keep);
-  }
+void VesknetDecoder::SaveReceivedSamples(const float* mono, int count) {
+  received_history_.Append(mono, count);
+  const int keep = static_cast<int>(std::round(kSavedSeconds * received_rate_));
+  if (received_history_.size() > keep)
+    received_history_.DropOldest(received_history_.size() - keep);
+}
 
-  // Down to complex baseband around the carrier.
-  mixed_.resize(mono_count);
-  std::complex<double> phasor = mixing_phasor_;
-  for (int i = 0; i < mono_count; ++i) {
-    mixed_[i] = std::complex<float>(static_cast<float>(mono[i] * phasor.real()),
-                                    static_cast<float>(mono[i] * phasor.imag()));
-    phasor *= mixing_increment_;
+void VesknetDecoder::AppendBaseband(const float* mono, int count) {
+  // Down to complex baseband around the carrier. The phasor advances by one
+  // complex product per sample, in four interleaved chains (sample i + 4 from
+  // sample i, by the fourth power of the step) so that the products do not
+  // wait on each other; the chains drift apart by rounding in double only.
+  // The products are written out: std::complex would test each for NaN.
+  mixed_.resize(count);
+  const double step_real = mixing_increment_.real(), step_imag = mixing_increment_.imag();
+  const double square_real = step_real * step_real - step_imag * step_imag;
+  const double square_imag = 2.0 * step_real * step_imag;
+  const double step4_real = square_real * square_real - square_imag * square_imag;
+  const double step4_imag = 2.0 * square_real * square_imag;
+  double phasor_real[4], phasor_imag[4];
+  phasor_real[0] = mixing_phasor_.real();
+  phasor_imag[0] = mixing_phasor_.imag();
+  for (int k = 1; k < 4; ++k) {
+    phasor_real[k] = phasor_real[k - 1] * step_real - phasor_imag[k - 1] * step_imag;
+    phasor_imag[k] = phasor_real[k - 1] * step_imag + phasor_imag[k - 1] * step_real;
   }
+  int i = 0;
+  for (; i + 4 <= count; i += 4) {
+    for (int k = 0; k < 4; ++k) {
+      mixed_[i + k] = std::complex<float>(static_cast<float>(mono[i + k] * phasor_real[k]),
+                                          static_cast<float>(mono[i + k] * phasor_imag[k]));
+      const double next_real = phasor_real[k] * step4_real - phasor_imag[k] * step4_imag;
+      phasor_imag[k] = phasor_real[k] * step4_imag + phasor_imag[k] * step4_real;
+      phasor_real[k] = next_real;
+    }
+  }
+  const int rest = count - i;
+  for (int k = 0; k < rest; ++k) {
+    mixed_[i + k] = std::complex<float>(static_cast<float>(mono[i + k] * phasor_real[k]),
+                                        static_cast<float>(mono[i + k] * phasor_imag[k]));
+  }
+  // The phasor of the next block's first sample.
+  const std::complex<double> phasor(phasor_real[rest], phasor_imag[rest]);
   mixing_phasor_ = phasor / std::abs(phasor);
   baseband_resampler_->ProcessSamples(mixed_, &resampled_);
   baseband_filter_->ProcessSamples(resampled_, &filtered_);
   new_real_.resize(filtered_.size());
   new_imag_.resize(filtered_.size());
-  for (size_t i = 0; i < filtered_.size(); ++i) {
-    new_real_[i] = filtered_[i].real();
-    new_imag_[i] = filtered_[i].imag();
+  for (size_t j = 0; j < filtered_.size(); ++j) {
+    new_real_[j] = filtered_[j].real();
+    new_imag_[j] = filtered_[j].imag();
   }
   baseband_real_.Append(new_real_);
   baseband_imag_.Append(new_imag_);
-  samples_received_ += mono_count;
+  samples_received_ += count;
+}
 
-  // Score what has not been scored yet.
+void VesknetDecoder::ScoreNewPositions() {
   const int length = baseband_real_.size();
-  new_real_.assign(baseband_real_.data() + unscored_, baseband_real_.data() + length);
-  new_imag_.assign(baseband_imag_.data() + unscored_, baseband_imag_.data() + length);
-  scorer_->ComputeScores(new_real_, new_imag_, &new_scores_);
+  scorer_->ComputeScores(baseband_real_.data() + unscored_, baseband_imag_.data() + unscored_,
+                         length - unscored_, &new_scores_);
   scores_.Append(new_scores_);
   unscored_ = length;
 }
@@ -226,6 +261,18 @@ void VesknetDecoder::DropHistory(int input_frames) {
   unscored_ -= drop;
   const int64_t oldest_kept = baseband_real_.dropped() + left_extension_;
   frame_cache_.erase(frame_cache_.begin(), frame_cache_.lower_bound(oldest_kept));
+
+  // The smoothed scores move with the scores. The oldest frames kept lose
+  // their neighbours and wait for the next request; so does everything when
+  // the frame rows no longer line up.
+  smoothed_.DropOldest(std::min(drop, smoothed_.size()));
+  smoothed_stale_ = std::max(0, smoothed_stale_ - drop);
+  if (drop % frame_size_ == 0) {
+    const int rows_before = params_.score_filter_count - (params_.score_filter_count - 1) / 2;
+    smoothed_stale_head_ = std::max(smoothed_stale_head_, rows_before);
+  } else {
+    smoothed_stale_ = 0;
+  }
 }
 
 bool VesknetDecoder::DetectBroadcaster() {
@@ -262,9 +309,10 @@ void VesknetDecoder::ScoreSymbols(const std::vector<float>& baseband_real_extend
   CHECK(symbol_scores);
 
   // Despread and taper.
-  std::vector<std::complex<float>> frame(extended_size);
+  std::vector<std::complex<float>>& frame = despread_;
+  frame.resize(extended_size);
   for (int n = 0; n < extended_size; ++n) {
-    const float gain = symbol_reference_[n] * frame_window_[n];
+    const float gain = despread_gain_[n];
     frame[n] = std::complex<float>(baseband_real_extended_frame[n] * gain,
                                    baseband_imaginary_extended_frame[n] * gain);
   }
@@ -272,32 +320,44 @@ void VesknetDecoder::ScoreSymbols(const std::vector<float>& baseband_real_extend
   // The Doppler shift that best lines up the chunk sums of the whole
   // extended frame.
   const int num_chunks = extended_size / chunk_length_;
-  std::vector<std::complex<float>> chunk_sums(num_chunks);
+  chunk_sums_.resize(num_chunks);
   for (int c = 0; c < num_chunks; ++c) {
     std::complex<float> sum = 0.0f;
     for (int n = c * chunk_length_; n < (c + 1) * chunk_length_; ++n) sum += frame[n];
-    chunk_sums[c] = sum;
+    chunk_sums_[c] = sum;
   }
-  const float shift = decode_shifts_[BestFilterRow(decode_phasors_, chunk_sums).first];
+  const float shift = decode_shifts_[BestFilterRow(decode_phasors_, chunk_sums_).first];
 
   // Remove that rotation from the central frame, then its constant phase.
-  const double step = -2.0 * M_PI * shift / frame_size_;
-  std::vector<std::complex<float>> central(frame_size_);
-  std::complex<double> correlation = 0.0;
+  // The rotation advances by one complex product per sample (in double; the
+  // drift over a frame stays far below single precision).
+  const std::complex<double> step = std::polar(1.0, -2.0 * M_PI * shift / frame_size_);
+  double turn_real = 1.0, turn_imag = 0.0;
+  std::complex<float>* central = frame.data() + left_extension_;
+  double correlation_real = 0.0, correlation_imag = 0.0;
   for (int n = 0; n < frame_size_; ++n) {
-    const std::complex<double> rotated =
-        std::complex<double>(frame[left_extension_ + n]) * std::polar(1.0, step * n);
-    central[n] = std::complex<float>(rotated);
-    correlation += rotated;
+    const double x = central[n].real(), y = central[n].imag();
+    const double rotated_real = x * turn_real - y * turn_imag;
+    const double rotated_imag = x * turn_imag + y * turn_real;
+    central[n] =
+        std::complex<float>(static_cast<float>(rotated_real), static_cast<float>(rotated_imag));
+    correlation_real += rotated_real;
+    correlation_imag += rotated_imag;
+    const double next_real = turn_real * step.real() - turn_imag * step.imag();
+    turn_imag = turn_real * step.imag() + turn_imag * step.real();
+    turn_real = next_real;
   }
-  double phase = std::atan2(correlation.imag(), correlation.real());
+  double phase = std::atan2(correlation_imag, correlation_real);
   // With the quadrature carrier the tones ride a quarter cycle from the pedestal.
   if (coder_->params().use_quadrature_carrier) phase += M_PI / 2;
   const std::complex<float> derotate(std::polar(1.0, -phase));
-  std::vector<float> aligned(frame_size_);
-  for (int n = 0; n < frame_size_; ++n) aligned[n] = (central[n] * derotate).real();
+  const float derotate_real = derotate.real(), derotate_imag = derotate.imag();
+  aligned_.resize(frame_size_);
+  for (int n = 0; n < frame_size_; ++n) {
+    aligned_[n] = central[n].real() * derotate_real - central[n].imag() * derotate_imag;
+  }
 
-  audio_dsp::MultiplyMatrixVector(coder_->baseband_tones(), aligned.data(), symbol_scores);
+  audio_dsp::MultiplyMatrixVector(coder_->baseband_tones(), aligned_.data(), symbol_scores);
 }
 
 bool VesknetDecoder::GetToken(VesknetDecodeResults* results) {
@@ -307,81 +367,182 @@ bool VesknetDecoder::GetToken(VesknetDecodeResults* results) {
   }
   CHECK(results);
   *results = VesknetDecodeResults();
+  SmoothScores();
+  GroupCandidateStarts();
+  const DecodingGroup* group = SelectGroup(groups_, TokenPeriodFrames());
+  if (group == nullptr) return false;
+  ScoreGroupFrames(*group, results);
+  SelectTokens(*group, results);
+  return !results->token_candidates.empty();
+}
 
-  // Integrate the scores along each frame and across successive frames, then
-  // keep only what stands clearly above the noise.
-  const std::vector<float> scores(scores_.data(), scores_.data() + scores_.size());
-  std::vector<float> filtered;
-  audio_dsp::BoxFilter2D(scores, frame_size_, params_.score_filter_length,
-                         params_.score_filter_count, /*allow_ragged=*/true, &filtered);
-  const float threshold =
-      params_.score_filter_length * params_.score_filter_count * params_.score_threshold_factor;
-  for (float& value : filtered) {
-    if (value < threshold) value = 0.0f;
+void VesknetDecoder::SmoothScores() {
+  const int n = scores_.size();
+  const int rows = n / frame_size_;
+  const int known = smoothed_.size();
+  if (known < n) smoothed_.AppendZeros(n - known);
+  // Rows whose box reaches the oldest frame after the history moved, and
+  // every row from the first one that new scores can reach.
+  SmoothRows(0, std::min(smoothed_stale_head_, rows));
+  SmoothRows(std::min(smoothed_stale_, known) / frame_size_, rows);
+  // The positions that do not fill a frame are not smoothed.
+  float* smoothed = smoothed_.mutable_data();
+  std::fill(smoothed + static_cast<int64_t>(rows) * frame_size_, smoothed + n, 0.0f);
+
+  // What new scores will reach: rows from h + 1 before the one that holds
+  // the last position whose row box extends past the end.
+  const int row_after = (params_.score_filter_length - 1) / 2;
+  const int column_after = (params_.score_filter_count - 1) / 2;
+  const int first_open = std::max(0, n - row_after) / frame_size_ - column_after;
+  smoothed_stale_ = std::max(0, first_open) * frame_size_;
+  smoothed_stale_head_ = 0;
+}
+
+void VesknetDecoder::SmoothRows(int first_row, int end_row) {
+  using audio_dsp::Double2;
+  using audio_dsp::Float4;
+  using audio_dsp::HighToDouble;
+  using audio_dsp::Load4;
+  using audio_dsp::LowToDouble;
+  using audio_dsp::Store4;
+  using audio_dsp::ToFloat4;
+  if (first_row >= end_row) return;
+  // The box sums of BoxFilter2D over the whole history, for these rows only:
+  // first along the flat stream (across row ends, up to its last score), then
+  // down each column over the complete rows. Each box is summed in double,
+  // oldest value first, and stored as float; four outputs at a time.
+  const int f = frame_size_;
+  const int n = scores_.size();
+  const int rows = n / f;
+  const int row_after = (params_.score_filter_length - 1) / 2;
+  const int row_before = params_.score_filter_length - row_after;  // Including k.
+  const int column_after = (params_.score_filter_count - 1) / 2;
+  const int column_before = params_.score_filter_count - column_after;
+  const int sum_first = std::max(0, first_row - column_before + 1);
+  const int sum_end = std::min(rows, end_row + column_after);
+  const float* scores = scores_.data();
+  const int begin = sum_first * f;
+  const int end = sum_end * f;
+  row_sums_.resize(end - begin);
+  float* row_sums = row_sums_.data() - begin;  // Indexed by stream position.
+  for (int j = begin; j < end;) {
+    if (j - row_before + 1 >= 0 && j + 3 + row_after < n && j + 4 <= end) {
+      Double2 low = {}, high = {};
+      for (int t = j - row_before + 1; t <= j + row_after; ++t) {
+        const Float4 values = Load4(scores + t);
+        low += LowToDouble(values);
+        high += HighToDouble(values);
+      }
+      Store4(row_sums + j, ToFloat4(low, high));
+      j += 4;
+    } else {
+      double sum = 0.0;
+      for (int t = std::max(0, j - row_before + 1); t <= std::min(n - 1, j + row_after); ++t) {
+        sum += scores[t];
+      }
+      row_sums[j] = static_cast<float>(sum);
+      ++j;
+    }
   }
+  float* smoothed = smoothed_.mutable_data();
+  const Float4 threshold = {score_threshold_, score_threshold_, score_threshold_, score_threshold_};
+  const Float4 zero = {};
+  for (int row = first_row; row < end_row; ++row) {
+    const int from = std::max(sum_first, row - column_before + 1);
+    const int to = std::min(sum_end - 1, row + column_after);
+    float* out = smoothed + static_cast<int64_t>(row) * f;
+    int c = 0;
+    for (; c + 4 <= f; c += 4) {
+      Double2 low = {}, high = {};
+      for (int r = from; r <= to; ++r) {
+        const Float4 values = Load4(row_sums + static_cast<int64_t>(r) * f + c);
+        low += LowToDouble(values);
+        high += HighToDouble(values);
+      }
+      const Float4 value = ToFloat4(low, high);
+      Store4(out + c, value < threshold ? zero : value);
+    }
+    for (; c < f; ++c) {
+      double sum = 0.0;
+      for (int r = from; r <= to; ++r) sum += row_sums[static_cast<int64_t>(r) * f + c];
+      const float value = static_cast<float>(sum);
+      out[c] = value < score_threshold_ ? 0.0f : value;
+    }
+  }
+}
 
-  // One candidate start per run of positive values, at its largest value;
-  // candidates join the first group whose grid they fit.
-  std::vector<DecodingGroup> groups;
-  const int n = static_cast<int>(filtered.size());
+void VesknetDecoder::GroupCandidateStarts() {
+  groups_.clear();
+  const float* smoothed = smoothed_.data();
+  const int n = smoothed_.size();
   for (int i = 0; i < n;) {
-    if (filtered[i] <= 0.0f) {
+    // Smoothed scores are 0 or above the threshold, so a zero bit pattern is
+    // a zero score: skip them eight at a time.
+    uint64_t bits[4];
+    if (i + 8 <= n && (std::memcpy(bits, smoothed + i, sizeof(bits)),
+                       (bits[0] | bits[1] | bits[2] | bits[3]) == 0)) {
+      i += 8;
+      continue;
+    }
+    if (!(smoothed[i] > 0.0f)) {
       ++i;
       continue;
     }
     int best = i;
-    for (; i < n && filtered[i] > 0.0f; ++i) {
-      if (filtered[i] > filtered[best]) best = i;
+    for (; i < n && smoothed[i] > 0.0f; ++i) {
+      if (smoothed[i] > smoothed[best]) best = i;
     }
     bool joined = false;
-    for (DecodingGroup& group : groups) {
-      if (group.Add(best, filtered[best])) {
+    for (DecodingGroup& group : groups_) {
+      if (group.Add(best, smoothed[best])) {
         joined = true;
         break;
       }
     }
     if (!joined) {
-      groups.emplace_back(best, filtered[best], frame_size_, params_.group_offset_tolerance,
-                          params_.group_max_gap);
+      groups_.emplace_back(best, smoothed[best], frame_size_, params_.group_offset_tolerance,
+                           params_.group_max_gap);
     }
   }
-  const DecodingGroup* group = SelectGroup(groups, TokenPeriodFrames());
-  if (group == nullptr) return false;
+}
 
+void VesknetDecoder::ScoreGroupFrames(const DecodingGroup& group, VesknetDecodeResults* results) {
   const int64_t dropped = baseband_real_.dropped();
   const int length = baseband_real_.size();
-  std::vector<float> real_frame(extended_size_), imag_frame(extended_size_);
-  for (const int position : group->times()) {
+  real_frame_.resize(extended_size_);
+  imag_frame_.resize(extended_size_);
+  for (const int position : group.times()) {
     results->frame_times.push_back(static_cast<float>((dropped + position) / baseband_rate_));
-    results->frame_scores.push_back(filtered[position]);
+    results->frame_scores.push_back(smoothed_[position]);
     const int start = position - left_extension_;
     if (start < 0 || start + extended_size_ > length) continue;
     const int64_t absolute = dropped + position;
     auto cached = frame_cache_.find(absolute);
     if (cached == frame_cache_.end()) {
       std::copy(baseband_real_.data() + start, baseband_real_.data() + start + extended_size_,
-                real_frame.begin());
+                real_frame_.begin());
       std::copy(baseband_imag_.data() + start, baseband_imag_.data() + start + extended_size_,
-                imag_frame.begin());
+                imag_frame_.begin());
       std::vector<float> symbol_scores;
-      ScoreSymbols(real_frame, imag_frame, &symbol_scores);
+      ScoreSymbols(real_frame_, imag_frame_, &symbol_scores);
       cached = frame_cache_.emplace(absolute, std::move(symbol_scores)).first;
     }
-    std::vector<float>& entry = results->frame_symbol_scores[group->FrameNumber(position)];
+    std::vector<float>& entry = results->frame_symbol_scores[group.FrameNumber(position)];
     if (entry.empty()) {
       entry = cached->second;
     } else {
       for (size_t s = 0; s < entry.size(); ++s) entry[s] += cached->second[s];
     }
   }
+}
 
+void VesknetDecoder::SelectTokens(const DecodingGroup& group, VesknetDecodeResults* results) {
   token_selector_.SelectTokens(results->frame_symbol_scores, &results->scores_table,
                                &results->token_candidates);
   for (TokenCandidate& candidate : results->token_candidates) {
     converter_->SymbolsToBytes(candidate.symbols, &candidate.bytes);
-    candidate.start_index = group->IndexOfFrame(candidate.start_index);
+    candidate.start_index = group.IndexOfFrame(candidate.start_index);
   }
-  return !results->token_candidates.empty();
 }
 
 }  // namespace audio_vesknet

@@ -14,7 +14,15 @@
 // Lifecycle: construct -> Initialize(rate, channels) -> ProcessSamples /
 // DetectBroadcaster / GetToken in any order; Initialize again restarts.
 // Calls before Initialize log an error and return a neutral value.
-// Memory: bounded by max_buffer_duration; buffers are reused across blocks.
+// Memory: bounded by max_buffer_duration. Buffers are reused: once they have
+// reached the block size, ProcessSamples allocates nothing (except when a
+// block longer than the whole buffer restarts the decoder); GetToken
+// allocates only its results and one cache entry per newly scored frame.
+// Cost: per baseband position the acquisition scorer's work (see
+// AcquisitionScorer); per request the smoothing of the scores that arrived
+// since the last one (and of the oldest frames after the history moved),
+// one pass over the smoothed scores for candidate starts, and the symbol
+// scores of frames not scored before.
 // Not thread-safe: one thread at a time.
 
 #ifndef AUDIO_VESKNET_VESKNET_DECODER_H_
@@ -30,6 +38,7 @@
 #include "audio/dsp/rational_factor_resampler.h"
 #include "audio/dsp/signal_vector_util.h"
 #include "audio/vesknet/acquisition_scorer.h"
+#include "audio/vesknet/decoding_group.h"
 #include "audio/vesknet/stream_buffer.h"
 #include "audio/vesknet/symbol_wave_coder.h"
 #include "audio/vesknet/token_selector.h"
@@ -115,6 +124,10 @@ struct VesknetDecodeResults {
 
 class VesknetDecoder {
  public:
+  // The largest Doppler shift searched, in carrier cycles per frame, for a
+  // coder of `carrier_cycles_per_frame`.
+  static float MaxDopplerShift(int carrier_cycles_per_frame, const VesknetDecoderParams& params);
+
   // `symbol_wave_coder` must outlive the decoder.
   VesknetDecoder(const SymbolWaveCoder* symbol_wave_coder, const VesknetDecoderParams& params);
   // The decoder owns `symbol_wave_coder`.
@@ -156,6 +169,15 @@ class VesknetDecoder {
   const VesknetDecoderParams& params() const { return params_; }
   const SymbolWaveCoder& symbol_wave_coder() const { return *coder_; }
 
+  // The baseband history and its acquisition scores (score i belongs to the
+  // position i), for tests.
+  const StreamBuffer<float>& baseband_real() const { return baseband_real_; }
+  const StreamBuffer<float>& baseband_imag() const { return baseband_imag_; }
+  const StreamBuffer<float>& acquisition_scores() const { return scores_; }
+  // The smoothed scores as of the last GetToken (box sums along and across
+  // frames, below the threshold 0), one per acquisition score; for tests.
+  const StreamBuffer<float>& smoothed_scores() const { return smoothed_; }
+
   // Symbol scores of one extended frame (extended_size() samples per part);
   // exposed for tests.
   void ScoreSymbols(const std::vector<float>& baseband_real_extended_frame,
@@ -168,7 +190,34 @@ class VesknetDecoder {
   float baseband_sample_rate() const { return baseband_rate_; }
 
  private:
+  // The steps of ProcessSamples.
+  // Drops the oldest history to make room for `input_frames` more frames.
   void DropHistory(int input_frames);
+  // Keeps the last 30 s of mono input (save_received_samples).
+  void SaveReceivedSamples(const float* mono, int count);
+  // Mixes mono input down to complex baseband around the carrier, resamples
+  // it to the baseband rate, low-pass filters it and appends it to the
+  // baseband streams.
+  void AppendBaseband(const float* mono, int count);
+  // Scores the baseband positions not scored yet.
+  void ScoreNewPositions();
+
+  // The steps of GetToken.
+  // Brings smoothed_ up to date with the scores: the box sums along each
+  // frame and across successive frames, below the threshold set to 0.
+  void SmoothScores();
+  // Every maximal run of positive smoothed scores gives one candidate start
+  // (its largest value); candidates join the first group whose grid they fit
+  // or open a new one. Rebuilds groups_.
+  void GroupCandidateStarts();
+  // The times, scores and symbol scores of the group's frames.
+  void ScoreGroupFrames(const DecodingGroup& group, VesknetDecodeResults* results);
+  // Token selection over the frames' symbol scores; bytes and frame indices
+  // filled in.
+  void SelectTokens(const DecodingGroup& group, VesknetDecodeResults* results);
+
+  // Smoothed scores of rows [first_row, end_row) of F positions each.
+  void SmoothRows(int first_row, int end_row);
   int TokenPeriodFrames() const;
 
   std::unique_ptr<const SymbolWaveCoder> owned_coder_;  // May be empty.
@@ -188,8 +237,10 @@ class VesknetDecoder {
   int left_extension_;
   std::vector<float> frame_window_;
   std::vector<float> symbol_reference_;
+  std::vector<float> despread_gain_;  // symbol_reference_ x frame_window_.
   std::vector<float> decode_shifts_;
   audio_dsp::MatrixXcf decode_phasors_;
+  float score_threshold_;  // Smoothed scores below it are 0.
 
   // Streaming state.
   StreamBuffer<float> received_history_;
@@ -210,6 +261,14 @@ class VesknetDecoder {
   // Symbol scores of frames already scored, by absolute baseband position.
   std::map<int64_t, std::vector<float>> frame_cache_;
 
+  // Smoothed scores, position by position like scores_ (dropped alike).
+  // Values from smoothed_stale_ on (and the first smoothed_stale_head_ rows
+  // after the history moved) wait for the next request.
+  StreamBuffer<float> smoothed_;
+  int smoothed_stale_ = 0;
+  int smoothed_stale_head_ = 0;
+  std::vector<DecodingGroup> groups_;
+
   // Per-block scratch, reused.
   std::vector<float> mono_;
   std::vector<std::complex<float>> mixed_;
@@ -218,6 +277,14 @@ class VesknetDecoder {
   std::vector<float> new_real_;
   std::vector<float> new_imag_;
   std::vector<float> new_scores_;
+  // Per-request scratch, reused.
+  std::vector<float> row_sums_;
+  std::vector<float> real_frame_;
+  std::vector<float> imag_frame_;
+  // ScoreSymbols scratch.
+  mutable std::vector<std::complex<float>> despread_;
+  mutable std::vector<std::complex<float>> chunk_sums_;
+  mutable std::vector<float> aligned_;
 };
 
 }  // namespace audio_vesknet

@@ -1,10 +1,13 @@
 #include "audio/vesknet/vesknet_decoder.h"
 
+#include <algorithm>
 #include <cmath>
 #include <complex>
 #include <memory>
+#include <random>
 #include <vector>
 
+#include "audio/dsp/box_filter.h"
 #include "audio/vesknet/vesknet_encoder.h"
 #include "base/scoped_log_capture.h"
 #include "gtest/gtest.h"
@@ -91,6 +94,48 @@ TEST(VesknetDecoderTest, DecodesCleanTokensOfBothCoders) {
       EXPECT_EQ(results.frame_times.size(), results.frame_scores.size());
     }
   }
+}
+
+// The smoothed scores, brought up to date request by request, are the box
+// sums of the whole score history (along each frame and across successive
+// frames, small ones set to 0), also while old history is being dropped.
+TEST(VesknetDecoderTest, SmoothedScoresFollowTheWholeHistory) {
+  const SymbolWaveCoder coder(Coder48k());
+  VesknetDecoderParams params = Params(coder);
+  params.max_buffer_duration /= 2;       // Two tokens: the history moves.
+  params.score_threshold_factor = 0.5f;  // Noise too stands above it.
+  VesknetDecoder decoder(&coder, params);
+  decoder.Initialize(44100, 1);
+  std::vector<float> audio = Transmission(Coder48k(), 44100);
+  std::mt19937 rng(3);
+  std::normal_distribution<float> noise(0.0f, 3000.0f);
+  for (float& sample : audio) sample += noise(rng);
+  const float threshold =
+      params.score_filter_length * params.score_filter_count * params.score_threshold_factor;
+  int requests = 0, positive = 0;
+  for (size_t start = 0, block = 0; start < audio.size(); start += 2048, ++block) {
+    decoder.ProcessSamples(std::vector<float>(
+        audio.begin() + start, audio.begin() + std::min(audio.size(), start + 2048)));
+    if (block % 5 != 4) continue;
+    VesknetDecodeResults results;
+    decoder.GetToken(&results);
+    ++requests;
+    const StreamBuffer<float>& scores = decoder.acquisition_scores();
+    std::vector<float> expected;
+    audio_dsp::BoxFilter2D(std::vector<float>(scores.data(), scores.data() + scores.size()),
+                           decoder.baseband_frame_size(), params.score_filter_length,
+                           params.score_filter_count, /*allow_ragged=*/true, &expected);
+    for (float& value : expected) {
+      if (value < threshold) value = 0.0f;
+    }
+    const StreamBuffer<float>& smoothed = decoder.smoothed_scores();
+    ASSERT_EQ(std::vector<float>(smoothed.data(), smoothed.data() + smoothed.size()), expected)
+        << "request " << requests;
+    positive += std::count_if(expected.begin(), expected.end(), [](float v) { return v > 0; });
+  }
+  EXPECT_GT(decoder.acquisition_scores().dropped(), 0);
+  EXPECT_GT(requests, 10);
+  EXPECT_GT(positive, 1000);
 }
 
 // With two channels the decoder hears their plain sum.

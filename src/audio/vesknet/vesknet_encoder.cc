@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <cmath>
+#include <limits>
+#include <utility>
 
 #include "audio/dsp/kiss_fft_util.h"
 #include "base/logging.h"
@@ -13,6 +15,17 @@ VesknetEncoder::VesknetEncoder(std::unique_ptr<SymbolWaveCoder> symbol_wave_code
     : symbol_wave_coder_(std::move(CHECK_NOTNULL(symbol_wave_coder))), params_(params) {
   CHECK(params_.broadcast_sample_rate > 0.0);
   converter_ = std::make_unique<TokenSymbolConverter>(symbol_wave_coder_->params().bits_per_symbol);
+  const int frames = params_.symbols_per_token + 1 + (params_.append_checksum_symbol ? 1 : 0);
+  const int64_t token_size = static_cast<int64_t>(frames) * symbol_wave_coder_->frame_size();
+  const float coder_rate = symbol_wave_coder_->params().sample_rate;
+  if (token_size > 0 && token_size <= std::numeric_limits<int>::max()) {
+    auto resampler = std::make_unique<audio_dsp::FftResampler>(
+        static_cast<int>(token_size), coder_rate, params_.broadcast_sample_rate);
+    // Equal lengths without a sideband filter are copied.
+    if (params_.single_sideband || resampler->output_size() != resampler->input_size()) {
+      resampler_ = std::move(resampler);
+    }
+  }
 }
 
 bool VesknetEncoder::EncodeToken(const std::vector<uint8_t>& bytes,
@@ -42,21 +55,29 @@ bool VesknetEncoder::EncodeSymbols(const std::vector<int32_t>& symbols,
     all_symbols.push_back(ChecksumSymbol(coder.alphabet_size(), symbols));
   }
 
-  output->clear();
-  output->reserve((all_symbols.size() + 1) * coder.frame_size());
+  // The symbol waves in a row: straight into the output when it is
+  // broadcast as it is, else into a buffer for the resampler.
+  std::vector<float> token;
+  std::vector<float>& waves = resampler_ == nullptr ? *output : token;
+  waves.clear();
+  waves.reserve((all_symbols.size() + 1) * coder.frame_size());
   const std::vector<float>& sync = coder.GetSyncSymbolWave();
-  output->insert(output->end(), sync.begin(), sync.end());
+  waves.insert(waves.end(), sync.begin(), sync.end());
   for (const int32_t symbol : all_symbols) {
     const std::vector<float>& wave = coder.GetSymbolWave(symbol);
-    output->insert(output->end(), wave.begin(), wave.end());
+    waves.insert(waves.end(), wave.begin(), wave.end());
   }
 
   const float coder_rate = coder.params().sample_rate;
-  if (params_.single_sideband && !output->empty()) {
+  if (resampler_ != nullptr && params_.single_sideband) {
+    // Only the upper sideband: everything from the carrier up. A carrier at
+    // half the coder rate may round a hair above it in float: it is the top.
+    const float nyquist = 0.5f * coder_rate;
     const float carrier = coder.carrier_cycles_per_frame() * coder_rate / coder.frame_size();
-    audio_dsp::HighPassFilter(*output, carrier, coder_rate, output);
+    resampler_->BandPassAndResample(token, std::min(carrier, nyquist), nyquist, output);
+  } else if (resampler_ != nullptr) {
+    resampler_->Resample(token, output);
   }
-  audio_dsp::FftResample(*output, coder_rate, params_.broadcast_sample_rate, output);
 
   float peak = 0.0f;
   for (const float sample : *output) peak = std::max(peak, std::fabs(sample));

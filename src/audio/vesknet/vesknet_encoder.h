@@ -7,7 +7,11 @@
 // peak_amplitude. It also makes the short fade-in that the host plays before
 // the token.
 //
-// Immutable after construction; every call works on its own output.
+// Immutable after construction; every call works on its own output. The
+// resampling to the broadcast rate (and the sideband filter) is planned at
+// construction for the token's length (see audio_dsp::FftResampler): an
+// encoder of a coder whose rate is not the broadcast rate holds about 2 MB
+// of transform tables, and encodes a token in a few milliseconds.
 
 #ifndef AUDIO_VESKNET_VESKNET_ENCODER_H_
 #define AUDIO_VESKNET_VESKNET_ENCODER_H_
@@ -16,6 +20,7 @@
 #include <memory>
 #include <vector>
 
+#include "audio/dsp/kiss_fft_util.h"
 #include "audio/vesknet/symbol_wave_coder.h"
 #include "audio/vesknet/token_selector.h"
 #include "audio/vesknet/token_symbol_converter.h"
@@ -60,6 +65,9 @@ class VesknetEncoder {
   std::unique_ptr<SymbolWaveCoder> symbol_wave_coder_;
   std::unique_ptr<TokenSymbolConverter> converter_;
   VesknetEncoderParams params_;
+  // From the coder's rate to the broadcast rate for one token's length; null
+  // when the token is broadcast as it is.
+  std::unique_ptr<audio_dsp::FftResampler> resampler_;
 };
 
 }  // namespace audio_vesknet

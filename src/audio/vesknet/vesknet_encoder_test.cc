@@ -1,11 +1,15 @@
 #include "audio/vesknet/vesknet_encoder.h"
 
+#include <algorithm>
 #include <cmath>
 #include <complex>
+#include <cstdlib>
 #include <memory>
 #include <vector>
 
 #include "audio/dsp/kiss_fft.h"
+#include "audio/dsp/kiss_fft_util.h"
+#include "audio/dsp/pcm_conversion.h"
 #include "base/scoped_log_capture.h"
 #include "gtest/gtest.h"
 
@@ -49,6 +53,82 @@ TEST(VesknetEncoderTest, RecordDefaultsResampledTo48k) {
   // The ramp ends on the token's last sample, so playback runs on into audio[0].
   EXPECT_FLOAT_EQ(transition.back(), audio.back() * 240.0f / 241.0f);
   EXPECT_FLOAT_EQ(transition.front(), audio[audio.size() - 240] / 241.0f);
+}
+
+// The token's audio as the encoder first made it, with a filter and a
+// resampler that transform the whole token at both lengths: the symbol waves
+// in a row, the upper sideband kept by HighPassFilter, FftResample to the
+// broadcast rate, scaled to the peak amplitude.
+std::vector<float> DirectlyEncoded(const SymbolWaveCoder& coder, const VesknetEncoderParams& params,
+                                   const std::vector<int32_t>& symbols) {
+  std::vector<float> audio = coder.GetSyncSymbolWave();
+  for (int32_t symbol : symbols) {
+    const std::vector<float>& wave = coder.GetSymbolWave(symbol);
+    audio.insert(audio.end(), wave.begin(), wave.end());
+  }
+  const float rate = coder.params().sample_rate;
+  if (params.single_sideband) {
+    const float carrier = coder.carrier_cycles_per_frame() * rate / coder.frame_size();
+    audio_dsp::HighPassFilter(audio, carrier, rate, &audio);
+  }
+  audio_dsp::FftResample(audio, rate, params.broadcast_sample_rate, &audio);
+  const float scale = params.peak_amplitude / Peak(audio);
+  for (float& sample : audio) sample *= scale;
+  return audio;
+}
+
+// The planned resampling keeps the 16-bit audio that the host plays within
+// one step of what whole-token transforms give, for both coders and other
+// rates, with and without the sideband filter, tokens of 8 and 16 symbols
+// and the checksum symbol.
+TEST(VesknetEncoderTest, SixteenBitAudioWithinOneStepOfWholeTokenTransforms) {
+  SymbolWaveCoderParams coder8 = ProductCoderParams();
+  coder8.bits_per_symbol = 8;
+  struct Case {
+    SymbolWaveCoderParams coder;
+    float broadcast_rate;
+    bool single_sideband;
+    bool checksum;
+  };
+  int max_step = 0;
+  size_t differing = 0, total = 0;
+  for (const Case& c :
+       {Case{SymbolWaveCoderParams(), 48000, false, false},
+        Case{SymbolWaveCoderParams(), 48000, true, true},
+        Case{SymbolWaveCoderParams(), 44100, true, false},
+        Case{ProductCoderParams(), 44100, false, true},
+        Case{ProductCoderParams(), 48000, true, false},
+        Case{ProductCoderParams(), 96000, false, false}, Case{coder8, 44100, true, true}}) {
+    VesknetEncoderParams params;
+    params.broadcast_sample_rate = c.broadcast_rate;
+    params.single_sideband = c.single_sideband;
+    params.append_checksum_symbol = c.checksum;
+    params.symbols_per_token = 64 / c.coder.bits_per_symbol;
+    const auto encoder = MakeEncoder(c.coder, params);
+    std::vector<int32_t> symbols;
+    ASSERT_TRUE(encoder->symbol_wave_coder().alphabet_size() > 2);
+    for (int i = 0; i < params.symbols_per_token; ++i) {
+      symbols.push_back((i * 7 + 3) % (encoder->symbol_wave_coder().alphabet_size() - 1));
+    }
+    std::vector<float> audio;
+    ASSERT_TRUE(encoder->EncodeSymbols(symbols, &audio));
+    std::vector<int32_t> all = symbols;
+    if (c.checksum) {
+      all.push_back(ChecksumSymbol(encoder->symbol_wave_coder().alphabet_size(), symbols));
+    }
+    const std::vector<float> expected = DirectlyEncoded(encoder->symbol_wave_coder(), params, all);
+    ASSERT_EQ(audio.size(), expected.size());
+    for (size_t i = 0; i < audio.size(); ++i) {
+      const int step =
+          std::abs(audio_dsp::FloatToPcm16(audio[i]) - audio_dsp::FloatToPcm16(expected[i]));
+      max_step = std::max(max_step, step);
+      differing += step != 0;
+    }
+    total += audio.size();
+  }
+  EXPECT_LE(max_step, 1);
+  // Rounding rarely lands across a 16-bit step.
+  EXPECT_LT(differing, total / 100);
 }
 
 TEST(VesknetEncoderTest, ProductDefaultsAreWholeFramesOfSymbolWaves) {
@@ -103,6 +183,26 @@ TEST(VesknetEncoderTest, SingleSidebandRemovesEverythingBelowTheCarrier) {
     (k * 48000.0 / n < carrier - 1 ? below : above) += std::norm(spectrum[k]);
   }
   EXPECT_LT(below, 1e-6 * above);
+}
+
+// A carrier at half the coder rate (4094 cycles in 8188-sample frames)
+// snaps to 11025.001 Hz in float: the upper sideband is then the top bin,
+// not a band that ends below where it starts.
+TEST(VesknetEncoderTest, SingleSidebandWithTheCarrierAtHalfTheCoderRate) {
+  SymbolWaveCoderParams coder;
+  coder.code_signal.assign(2047, 1.0f);
+  coder.sample_rate = 22050;
+  coder.upsampling_factor = 4;
+  coder.baseband_decimation_factor = 4;
+  coder.desired_carrier_frequency = 11025;
+  VesknetEncoderParams params;
+  params.broadcast_sample_rate = 22051;
+  params.single_sideband = true;
+  const auto encoder = MakeEncoder(coder, params);
+  ASSERT_GT(encoder->symbol_wave_coder().carrier_frequency(), 11025.0f);
+  std::vector<float> audio;
+  ASSERT_TRUE(encoder->EncodeToken(kToken, &audio));
+  EXPECT_FALSE(audio.empty());
 }
 
 TEST(VesknetEncoderTest, RefusesWrongInputWithoutTouchingTheOutput) {

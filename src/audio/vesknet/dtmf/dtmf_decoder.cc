@@ -8,7 +8,7 @@
 
 #include "audio/dsp/max_filter.h"
 #include "audio/dsp/resampling_kernel.h"
-#include "audio/vesknet/compute_buffer_truncation.h"
+#include "audio/vesknet/stream_intake.h"
 #include "base/logging.h"
 
 // Some checks compare a vector's size with an int, as their texts read.
@@ -72,10 +72,6 @@ int64_t RoundToFrameCount(double value) {
   return static_cast<int64_t>(std::min<double>(rounded, std::numeric_limits<int32_t>::max()));
 }
 
-int32_t ClampToInt32(int64_t value) {
-  return static_cast<int32_t>(std::min<int64_t>(value, std::numeric_limits<int32_t>::max()));
-}
-
 }  // namespace
 
 DtmfDecoder::DtmfDecoder(const DtmfDecoderParams& params)
@@ -99,6 +95,14 @@ DtmfDecoder::DtmfDecoder(const DtmfDecoderParams& params)
                                params_.baseband_decimation_factor);
   }
   folded_.resize(samples_per_symbol_);
+  filter_outputs_.resize(num_frequencies_);
+  normalized_rows_.resize(num_frequencies_);
+  // Truncated; at least one sample (a width of 0 would be no maximum at all)
+  // and bounded so that the product cannot overflow.
+  const double width =
+      std::floor(static_cast<double>(samples_per_symbol_) *
+                 static_cast<double>(params_.tone_normalization_params.window_size));
+  normalization_window_ = static_cast<int>(std::max(1.0, std::min(width, double{1 << 30})));
 }
 
 DtmfDecoder::~DtmfDecoder() = default;
@@ -128,12 +132,22 @@ void DtmfDecoder::Init(float received_sample_rate, int num_channels) {
   tone_strength_buffer_size_ = 0;
   for (ToneStrengthFilter& filter : tone_filters_) filter.Reset();
   for (ToneStrengthQueue& buffer : tone_strength_buffers_) buffer.Clear();
+  ClearToneScores();
   initialized_ = true;
+}
+
+void DtmfDecoder::ClearToneScores() {
+  for (ToneStrengthQueue& row : normalized_rows_) row.Clear();
+  peak_.Clear();
+  noise_sum_.Clear();
+  scores_stale_ = 0;
+  scores_stale_head_ = 0;
 }
 
 void DtmfDecoder::Reset() {
   for (ToneStrengthQueue& buffer : tone_strength_buffers_) buffer.Clear();
   tone_strength_buffer_size_ = 0;
+  ClearToneScores();
   if (initialized_) Init(received_sample_rate_, num_channels_);
 }
 
@@ -153,38 +167,28 @@ void DtmfDecoder::ProcessSamples(const std::vector<float>& received_samples) {
     return;
   }
   if (received_samples.empty()) return;
+  const int64_t count = static_cast<int64_t>(received_samples.size());
+  const int64_t first = AdmitBlock(
+      count, num_channels_, token_length_, max_buffer_size_,
+      [this] { return buffered_received_samples(); },
+      [this] { Init(received_sample_rate_, num_channels_); },
+      [this](int frames) { DropHistory(frames); });
+  if (first == count) return;
 
-  const int64_t input_frames = static_cast<int64_t>(received_samples.size()) / num_channels_;
-  int32_t samples_to_skip = 0;
-  int32_t samples_to_drop = 0;
-  ComputeBufferTruncation(ClampToInt32(input_frames), ClampToInt32(buffered_received_samples()),
-                          ClampToInt32(token_length_), ClampToInt32(max_buffer_size_),
-                          &samples_to_skip, &samples_to_drop);
-  const int64_t skipped_values = static_cast<int64_t>(samples_to_skip) * num_channels_;
-  if (skipped_values >= 1) {
-    // The block alone overruns the buffer: start afresh on its tail.
-    Init(received_sample_rate_, num_channels_);
-    ProcessSamples(
-        std::vector<float>(received_samples.begin() + skipped_values, received_samples.end()));
-    return;
-  }
-  if (samples_to_drop > 0) DropHistory(samples_to_drop);
-
+  const float* samples = received_samples.data() + first;
   if (num_channels_ == 1) {
-    FeedMono(received_samples);
+    if (first == 0) {
+      FeedMono(received_samples);
+    } else {
+      mono_.assign(samples, received_samples.data() + count);
+      FeedMono(mono_);
+    }
     return;
   }
   CHECK(received_samples.size() % num_channels_ == 0);
-  const int frames = static_cast<int>(input_frames);
-  const float scale = 1.0f / static_cast<float>(num_channels_);
-  mono_.resize(frames);
-  const float* interleaved = received_samples.data();
-  for (int i = 0; i < frames; ++i) {
-    float sum = 0.0f;
-    for (int c = 0; c < num_channels_; ++c) sum += interleaved[c];
-    mono_[i] = sum * scale;
-    interleaved += num_channels_;
-  }
+  // The mean of the channels.
+  DownmixChannels(samples, static_cast<int>((count - first) / num_channels_), num_channels_,
+                  1.0f / static_cast<float>(num_channels_), &mono_);
   FeedMono(mono_);
 }
 
@@ -196,6 +200,17 @@ void DtmfDecoder::DropHistory(int64_t received_samples) {
   const int count = static_cast<int>(std::min<int64_t>(drop, tone_strength_buffer_size_));
   for (ToneStrengthQueue& buffer : tone_strength_buffers_) buffer.DropFront(count);
   tone_strength_buffer_size_ -= count;
+  // The scores kept move with the strengths; the oldest times lose part of
+  // their window and wait for the next request.
+  const int kept = std::min(count, peak_.Size());
+  for (ToneStrengthQueue& row : normalized_rows_) row.DropFront(kept);
+  peak_.DropFront(kept);
+  noise_sum_.DropFront(kept);
+  scores_stale_ = std::max(0, scores_stale_ - count);
+  if (count > 0) {
+    const int after = (normalization_window_ - 1) / 2;
+    scores_stale_head_ = std::max(scores_stale_head_, normalization_window_ - after - 1);
+  }
 }
 
 void DtmfDecoder::FeedMono(const std::vector<float>& mono) {
@@ -204,62 +219,101 @@ void DtmfDecoder::FeedMono(const std::vector<float>& mono) {
     received_resampler_->ProcessSamples(mono, &resampled_);
     input = &resampled_;
   }
+  ToneStrengthFilter::ProcessAll(tone_filters_.data(), num_frequencies_, *input,
+                                 filter_outputs_.data());
   for (int i = 0; i < num_frequencies_; ++i) {
-    tone_filters_[i].Process(*input, &filter_output_);
-    tone_strength_buffers_[i].Append(filter_output_);
-    if (i == 0) tone_strength_buffer_size_ += static_cast<int>(filter_output_.size());
+    tone_strength_buffers_[i].Append(filter_outputs_[i]);
+    if (i == 0) tone_strength_buffer_size_ += static_cast<int>(filter_outputs_[i].size());
     CHECK(tone_strength_buffers_[i].Size() == tone_strength_buffer_size_);
   }
 }
 
 void DtmfDecoder::NormalizeToneStrengths(audio_dsp::MatrixXf* tone_scores) {
   CHECK(tone_scores);
-  NormalizeToRows();
+  UpdateToneScores();
   const int n = tone_strength_buffer_size_;
   // Every element is written below; resize only zero-fills on a new shape.
   if (tone_scores->rows() != num_frequencies_ || tone_scores->cols() != n) {
     tone_scores->resize(num_frequencies_, n);
   }
-  for (int t = 0; t < n; ++t) {
-    float* column = tone_scores->col(t);
-    for (int i = 0; i < num_frequencies_; ++i)
-      column[i] = normalized_[static_cast<size_t>(i) * n + t];
+  for (int i = 0; i < num_frequencies_; ++i) {
+    const float* normalized = normalized_rows_[i].data();
+    for (int t = 0; t < n; ++t) (*tone_scores)(i, t) = normalized[t];
   }
 }
 
-void DtmfDecoder::NormalizeToRows() {
+void DtmfDecoder::UpdateToneScores() {
+  const int n = tone_strength_buffer_size_;
+  const int known = peak_.Size();
+  if (known < n) {
+    for (ToneStrengthQueue& row : normalized_rows_) row.AppendZeros(n - known);
+    peak_.AppendZeros(n - known);
+    noise_sum_.AppendZeros(n - known);
+  }
+  // Times whose window reaches the oldest strengths after the history moved,
+  // and every time from the first whose window reaches past the strengths
+  // scored before.
+  ScoreTimes(0, std::min(scores_stale_head_, n));
+  ScoreTimes(std::max(std::min(scores_stale_, known), std::min(scores_stale_head_, n)), n);
+  const int after = (normalization_window_ - 1) / 2;
+  scores_stale_ = std::max(0, n - after);
+  scores_stale_head_ = 0;
+}
+
+void DtmfDecoder::ScoreTimes(int first, int end) {
+  if (first >= end) return;
   const int n = tone_strength_buffer_size_;
   const DtmfDecoderParams::ToneNormalizationParams& normalization =
       params_.tone_normalization_params;
-  // Truncated; at least one sample (a width of 0 would be no maximum at all)
-  // and bounded so that the product cannot overflow.
-  const double width = std::floor(static_cast<double>(samples_per_symbol_) *
-                                  static_cast<double>(normalization.window_size));
-  const int window = static_cast<int>(std::max(1.0, std::min(width, double{1 << 30})));
-
-  normalized_.resize(static_cast<size_t>(num_frequencies_) * n);
-  for (int i = 0; i < num_frequencies_; ++i) {
-    audio_dsp::MaxFilter(tone_strength_buffers_[i].data(), n, window,
-                         normalized_.data() + static_cast<size_t>(i) * n, &max_filter_scratch_);
-  }
-
-  // m: the strongest tone's running maximum at each time.
-  column_max_.assign(normalized_.begin(), normalized_.begin() + n);
-  for (int i = 1; i < num_frequencies_; ++i) {
-    const float* x = normalized_.data() + static_cast<size_t>(i) * n;
+  // Each tone's running maximum at these times, from the strengths that
+  // their windows cover (the maximum is exact, so a part of the history gives
+  // the values of the whole).
+  const int w = normalization_window_;
+  const int after = (w - 1) / 2;
+  const int before = w - after;  // Including t.
+  const int from = std::max(0, first - before + 1);
+  const int to = std::min(n, end + after);
+  const int count = end - first;
+  const int span = to - from;
+  column_max_.resize(count);
+  // Four tones at a time, one per lane: the running maxima of the lanes are
+  // independent and the maximum is exact, so each lane gets what MaxFilter
+  // of its own tone gives.
+  tone_lanes_.resize(span);
+  for (int group = 0; group < num_frequencies_; group += 4) {
+    const int lanes = std::min(4, num_frequencies_ - group);
+    for (int l = 0; l < 4; ++l) {
+      const float* strengths = tone_strength_buffers_[group + std::min(l, lanes - 1)].data() + from;
+      for (int t = 0; t < span; ++t) tone_lanes_[t][l] = strengths[t];
+    }
+    running_max_.resize(span);
+    audio_dsp::MaxFilter(tone_lanes_.data(), span, w, running_max_.data(), &max_filter_scratch_);
+    for (int l = 0; l < lanes; ++l) {
+      const int i = group + l;
+      float* x = normalized_rows_[i].mutable_data() + first;
+      for (int t = 0; t < count; ++t) x[t] = running_max_[first - from + t][l];
+      // m: the strongest tone's running maximum at each time.
+      if (i == 0) {
+        std::copy(x, x + count, column_max_.begin());
+      } else {
 #pragma omp simd
-    for (int t = 0; t < n; ++t) column_max_[t] = std::max(column_max_[t], x[t]);
+        for (int t = 0; t < count; ++t) column_max_[t] = std::max(column_max_[t], x[t]);
+      }
+    }
   }
   // In place of the running maxima, tone by tone (vectorisable).
   const float weight = normalization.cross_frequency_weight;
   const float floor = normalization.division_floor;
   const float* m = column_max_.data();
+  rows_.resize(num_frequencies_);
   for (int i = 0; i < num_frequencies_; ++i) {
-    float* x = normalized_.data() + static_cast<size_t>(i) * n;
-    const float* s = tone_strength_buffers_[i].data();
+    float* x = normalized_rows_[i].mutable_data() + first;
+    const float* s = tone_strength_buffers_[i].data() + first;
 #pragma omp simd
-    for (int t = 0; t < n; ++t) x[t] = s[t] / ((m[t] - x[t]) * weight + x[t] + floor);
+    for (int t = 0; t < count; ++t) x[t] = s[t] / ((m[t] - x[t]) * weight + x[t] + floor);
+    rows_[i] = normalized_rows_[i].data() + first;
   }
+  SelectPeaks(rows_.data(), count, peak_.mutable_data() + first, noise_sum_.mutable_data() + first);
 }
 
 void DtmfDecoder::ComputeAcquisitionScores(const audio_dsp::MatrixXf& tone_scores,
@@ -269,16 +323,23 @@ void DtmfDecoder::ComputeAcquisitionScores(const audio_dsp::MatrixXf& tone_score
   CHECK(acquisition_scores);
   const int n = tone_strength_buffer_size_;
   // Tone-major copy, in one sequential pass over the columns.
-  rows_.resize(static_cast<size_t>(num_frequencies_) * n);
+  tone_major_.resize(static_cast<size_t>(num_frequencies_) * n);
   for (int t = 0; t < n; ++t) {
     const float* column = tone_scores.col(t);
-    for (int i = 0; i < num_frequencies_; ++i) rows_[static_cast<size_t>(i) * n + t] = column[i];
+    for (int i = 0; i < num_frequencies_; ++i) {
+      tone_major_[static_cast<size_t>(i) * n + t] = column[i];
+    }
   }
-  ScoreToneRows(rows_.data(), acquisition_scores);
+  rows_.resize(num_frequencies_);
+  for (int i = 0; i < num_frequencies_; ++i)
+    rows_[i] = tone_major_.data() + static_cast<size_t>(i) * n;
+  acquisition_scores->resize(n);
+  noise_.resize(n);
+  SelectPeaks(rows_.data(), n, acquisition_scores->data(), noise_.data());
+  FinishAcquisitionScores(acquisition_scores->data(), acquisition_scores);
 }
 
-void DtmfDecoder::ScoreToneRows(const float* rows, std::vector<float>* acquisition_scores) {
-  const int n = tone_strength_buffer_size_;
+void DtmfDecoder::SelectPeaks(const float* const* rows, int count, float* peak, float* noise) {
   // Position of the tones_per_symbol-th largest value; the k below it are the
   // noise.
   const int k = std::max(0, num_frequencies_ - params_.tones_per_symbol);
@@ -288,17 +349,17 @@ void DtmfDecoder::ScoreToneRows(const float* rows, std::vector<float>* acquisiti
   // bubbles through the top_count largest so far (largest first); what falls
   // out of the last place is one of the k values below position k of the
   // ascending order, and goes to the noise sum.
-  top_.assign(static_cast<size_t>(top_count) * n, -std::numeric_limits<float>::infinity());
-  noise_.assign(n, 0.0f);
-  float* __restrict noise_sum = noise_.data();
-  moving_.resize(n);
+  top_.assign(static_cast<size_t>(top_count) * count, -std::numeric_limits<float>::infinity());
+  std::fill(noise, noise + count, 0.0f);
+  float* __restrict noise_sum = noise;
+  moving_.resize(count);
   float* __restrict moving = moving_.data();
   for (int i = 0; i < num_frequencies_; ++i) {
-    std::copy(rows + static_cast<size_t>(i) * n, rows + static_cast<size_t>(i + 1) * n, moving);
+    std::copy(rows[i], rows[i] + count, moving);
     for (int j = 0; j < top_count; ++j) {
-      float* __restrict kept = top_.data() + static_cast<size_t>(j) * n;
+      float* __restrict kept = top_.data() + static_cast<size_t>(j) * count;
 #pragma omp simd
-      for (int t = 0; t < n; ++t) {
+      for (int t = 0; t < count; ++t) {
         const float larger = std::max(moving[t], kept[t]);
         moving[t] = std::min(moving[t], kept[t]);
         kept[t] = larger;
@@ -306,16 +367,24 @@ void DtmfDecoder::ScoreToneRows(const float* rows, std::vector<float>* acquisiti
     }
     if (i >= top_count) {
 #pragma omp simd
-      for (int t = 0; t < n; ++t) noise_sum[t] += moving[t];
+      for (int t = 0; t < count; ++t) noise_sum[t] += moving[t];
     }
   }
-  const float* peak = top_.data() + static_cast<size_t>(top_count - 1) * n;
-  acquisition_scores->assign(peak, peak + n);
+  const float* last = top_.data() + static_cast<size_t>(top_count - 1) * count;
+  std::copy(last, last + count, peak);
   if (k > 0) {
-    for (float& noise : noise_) noise /= static_cast<float>(k);
+    for (int t = 0; t < count; ++t) noise[t] /= static_cast<float>(k);
   }
+}
+
+void DtmfDecoder::FinishAcquisitionScores(const float* peak,
+                                          std::vector<float>* acquisition_scores) {
+  const int n = tone_strength_buffer_size_;
+  // noise_ holds the noise of every time, not yet smoothed.
   SmoothNoiseEstimate(&noise_);
-  for (int t = 0; t < n; ++t) (*acquisition_scores)[t] /= noise_[t] + kNoiseFloor;
+  acquisition_scores->resize(n);
+  float* scores = acquisition_scores->data();
+  for (int t = 0; t < n; ++t) scores[t] = peak[t] / (noise_[t] + kNoiseFloor);
 }
 
 void DtmfDecoder::SmoothNoiseEstimate(std::vector<float>* noise) {
@@ -419,16 +488,20 @@ std::vector<DtmfDecodedToken> DtmfDecoder::GetToken() {
     return tokens;
   }
   // The steps of NormalizeToneStrengths, ComputeAcquisitionScores and
-  // FindCandidates, on the normalised strengths as they come, tone after tone
-  // (the public steps lay them out time after time, which costs two copies).
-  NormalizeToRows();
-  ScoreToneRows(normalized_.data(), &acquisition_scores_);
+  // FindCandidates, on the normalised strengths kept between requests, tone
+  // after tone (the public steps lay them out time after time, which costs
+  // two copies).
+  UpdateToneScores();
+  const int n = tone_strength_buffer_size_;
+  noise_.assign(noise_sum_.data(), noise_sum_.data() + n);
+  FinishAcquisitionScores(peak_.data(), &acquisition_scores_);
   const int start = ComputeStartOffset(acquisition_scores_);
-  const size_t n = static_cast<size_t>(tone_strength_buffer_size_);
-  const float* normalized = normalized_.data();
+  rows_.resize(num_frequencies_);
+  for (int i = 0; i < num_frequencies_; ++i) rows_[i] = normalized_rows_[i].data();
+  const float* const* rows = rows_.data();
   std::map<int, std::vector<float>> candidates;
-  FindCandidatesIn([normalized, n](int tone, int64_t t) { return normalized[tone * n + t]; },
-                   acquisition_scores_, start, &candidates);
+  FindCandidatesIn([rows](int tone, int64_t t) { return rows[tone][t]; }, acquisition_scores_,
+                   start, &candidates);
   // Fewer candidates than one token period cannot cover every position.
   if (static_cast<int>(candidates.size()) < token_selector_.symbol_period()) return tokens;
 

@@ -28,8 +28,10 @@
 // happens at construction and Init, and the per-block and per-request paths
 // reuse member buffers once they have reached the history's size (a request
 // builds only its candidate map, a few dozen entries, and its results).
-// Cost: per input sample one filter step per tone; per request
-// O(history x tones).
+// Cost: per input sample one filter step per tone (four tones per vector);
+// per request, normalisation and peak selection of the times that new
+// strengths reach (and, after the history moved, of the oldest window), then
+// O(history) for the noise smoothing, the timing and the candidates.
 // Not thread-safe: one thread at a time.
 
 #ifndef AUDIO_VESKNET_DTMF_DTMF_DECODER_H_
@@ -43,6 +45,7 @@
 #include "audio/dsp/gamma_filter.h"
 #include "audio/dsp/matrix.h"
 #include "audio/dsp/rational_factor_resampler.h"
+#include "audio/dsp/simd.h"
 #include "audio/vesknet/dtmf/byte_symbol_converter.h"
 #include "audio/vesknet/dtmf/dtmf_encoder_params.h"
 #include "audio/vesknet/dtmf/tone_strength_filter.h"
@@ -176,6 +179,10 @@ class DtmfDecoder {
   bool has_resampler() const { return received_resampler_ != nullptr; }
   int64_t token_length_received_samples() const { return token_length_; }
 
+  // The acquisition scores of the last GetToken call, one per time held
+  // then; for tests.
+  const std::vector<float>& last_acquisition_scores() const { return acquisition_scores_; }
+
   // The steps of GetToken, public for tests.
 
   // Replaces *tone_scores with the normalised history: num_frequencies() rows,
@@ -208,7 +215,9 @@ class DtmfDecoder {
    public:
     int Size() const { return buffer_.size(); }
     const float* data() const { return buffer_.data(); }
+    float* mutable_data() { return buffer_.mutable_data(); }
     void Append(const std::vector<float>& values) { buffer_.Append(values); }
+    void AppendZeros(int count) { buffer_.AppendZeros(count); }
     void DropFront(int count) { buffer_.DropOldest(count); }
     void Clear() { buffer_.Clear(); }
 
@@ -218,11 +227,20 @@ class DtmfDecoder {
 
   void DropHistory(int64_t received_samples);
   void FeedMono(const std::vector<float>& mono);
-  // NormalizeToneStrengths into normalized_, laid out tone after tone
-  // (normalized_[i * n + t]).
-  void NormalizeToRows();
-  // ComputeAcquisitionScores on tone scores laid out tone after tone.
-  void ScoreToneRows(const float* rows, std::vector<float>* acquisition_scores);
+  // Brings normalized_rows_, peak_ and noise_sum_ up to date with the tone
+  // strengths: only the times that new strengths can reach, and the oldest
+  // ones after the history moved, are scored again.
+  void UpdateToneScores();
+  // Scores times [first, end): running maxima, normalisation, peak and noise.
+  void ScoreTimes(int first, int end);
+  void ClearToneScores();
+  // For `count` times of the tone rows rows[i][0 .. count): the
+  // tones_per_symbol-th largest value into peak and the mean of the values
+  // below it into noise (not smoothed).
+  void SelectPeaks(const float* const* rows, int count, float* peak, float* noise);
+  // Smooths noise_ and sets *acquisition_scores to peak / (smoothed noise +
+  // a floor), for every time held.
+  void FinishAcquisitionScores(const float* peak, std::vector<float>* acquisition_scores);
   // FindCandidates reading tone scores through tone_score(tone, t).
   template <typename ToneScore>
   void FindCandidatesIn(ToneScore tone_score, const std::vector<float>& acquisition_scores,
@@ -251,17 +269,30 @@ class DtmfDecoder {
   std::unique_ptr<audio_dsp::RationalFactorResampler<float>> received_resampler_;
   bool initialized_ = false;
 
+  // Scores per time kept between requests, time after time like the tone
+  // strengths and dropped alike: each tone's normalised strength, the
+  // tones_per_symbol-th largest of them and the mean of the weaker ones.
+  // Times from scores_stale_ on, and below scores_stale_head_ after the
+  // history moved, wait for the next request.
+  std::vector<ToneStrengthQueue> normalized_rows_;
+  ToneStrengthQueue peak_;
+  ToneStrengthQueue noise_sum_;
+  int scores_stale_ = 0;
+  int scores_stale_head_ = 0;
+  int normalization_window_ = 1;  // Width of the running maxima, samples.
+
   // Per-block and per-request scratch, reused.
   std::vector<float> mono_;
   std::vector<float> resampled_;
-  std::vector<float> filter_output_;
-  // Running maxima, then the normalised strengths, tone after tone.
-  std::vector<float> normalized_;
+  std::vector<std::vector<float>> filter_outputs_;  // One per tone.
+  std::vector<audio_dsp::Float4> tone_lanes_;       // Four tones' strengths per time.
+  std::vector<audio_dsp::Float4> running_max_;      // Their running maxima.
+  std::vector<audio_dsp::Float4> max_filter_scratch_;
   std::vector<float> column_max_;
-  std::vector<float> max_filter_scratch_;
-  std::vector<float> rows_;    // ComputeAcquisitionScores' input, tone after tone.
-  std::vector<float> top_;     // The largest values of each time, rank after rank.
-  std::vector<float> moving_;  // One tone's values on their way through top_.
+  std::vector<const float*> rows_;  // Tone rows handed to SelectPeaks.
+  std::vector<float> tone_major_;   // ComputeAcquisitionScores' input, tone after tone.
+  std::vector<float> top_;          // The largest values of each time, rank after rank.
+  std::vector<float> moving_;       // One tone's values on their way through top_.
   std::vector<float> noise_;
   std::vector<float> acquisition_scores_;
   audio_dsp::MatrixXf scores_table_;

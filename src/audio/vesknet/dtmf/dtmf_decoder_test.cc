@@ -4,6 +4,7 @@
 #include <cmath>
 #include <vector>
 
+#include "audio/dsp/max_filter.h"
 #include "audio/vesknet/dtmf/dtmf_encoder.h"
 #include "base/scoped_log_capture.h"
 #include "gtest/gtest.h"
@@ -175,6 +176,62 @@ TEST(DtmfDecoderTest, HistoryStaysBoundedAndDropsWholeSymbols) {
     ASSERT_EQ((fed / 16 - held) % kP, 0) << "block " << block;
   }
   EXPECT_GT(fed / 16, decoder.tone_strength_buffer_size());
+}
+
+// Requests bring the normalised strengths and acquisition scores kept
+// between them up to date, new times and (after the history moved) the
+// oldest ones: they equal the whole history's, computed afresh.
+TEST(DtmfDecoderTest, ScoresKeptBetweenRequestsEqualTheWholeHistorys) {
+  DtmfDecoderParams params = ProductParams();
+  params.max_buffer_duration_in_seconds = 1.0f;
+  DtmfDecoder decoder(params);
+  decoder.Init(44100.0f, 1);
+  const DtmfEncoder encoder(params);
+  std::vector<float> token;
+  encoder.EncodeToken({7, 6, 5, 4, 3}, &token);
+  std::vector<float> audio = Play(token, 6);
+  const std::vector<float> noise = Noise(static_cast<int>(audio.size()), 8, 300.0f);
+  for (size_t i = 0; i < audio.size(); ++i) audio[i] += noise[i];
+  const DtmfDecoderParams::ToneNormalizationParams& normalization =
+      params.tone_normalization_params;
+  const int window = static_cast<int>(kP * normalization.window_size);
+  int requests = 0;
+  for (size_t start = 0, block = 0; start < audio.size(); start += 3000, ++block) {
+    decoder.ProcessSamples(std::vector<float>(
+        audio.begin() + start, audio.begin() + std::min(audio.size(), start + 3000)));
+    if (block % 3 != 2) continue;
+    decoder.GetToken();
+    ++requests;
+    // The normalisation from scratch: running maxima, the strongest of them,
+    // each strength over its divisor.
+    const int n = decoder.tone_strength_buffer_size();
+    std::vector<std::vector<float>> maxima(10, std::vector<float>(n));
+    std::vector<float> strongest(n, 0.0f);
+    for (int tone = 0; tone < 10; ++tone) {
+      audio_dsp::MaxFilter(decoder.ToneStrengths(tone).data(), n, window, maxima[tone].data());
+      for (int t = 0; t < n; ++t) {
+        strongest[t] = tone == 0 ? maxima[0][t] : std::max(strongest[t], maxima[tone][t]);
+      }
+    }
+    audio_dsp::MatrixXf tones;
+    decoder.NormalizeToneStrengths(&tones);
+    ASSERT_EQ(tones.cols(), n);
+    for (int tone = 0; tone < 10; ++tone) {
+      const std::vector<float> strengths = decoder.ToneStrengths(tone);
+      for (int t = 0; t < n; ++t) {
+        const float x = maxima[tone][t];
+        ASSERT_EQ(tones(tone, t),
+                  strengths[t] / ((strongest[t] - x) * normalization.cross_frequency_weight + x +
+                                  normalization.division_floor))
+            << "request " << requests << " tone " << tone << " time " << t;
+      }
+    }
+    std::vector<float> acquisition;
+    decoder.ComputeAcquisitionScores(tones, &acquisition);
+    ASSERT_EQ(decoder.last_acquisition_scores(), acquisition) << "request " << requests;
+  }
+  EXPECT_GT(requests, 15);
+  EXPECT_GT(decoder.tone_strength_buffer_size(), 0);
 }
 
 TEST(DtmfDecoderTest, ShortNoiseVectorBecomesItsMeanAndLongOneIsAligned) {

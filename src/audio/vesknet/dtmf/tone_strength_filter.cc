@@ -6,6 +6,7 @@
 #include <cstddef>
 #include <limits>
 
+#include "audio/dsp/simd.h"
 #include "base/logging.h"
 
 namespace audio_vesknet {
@@ -133,6 +134,102 @@ void ToneStrengthFilter::Process(const std::vector<float>& input,
   cosine_sum_ = cosine_sum;
   sine_sum_ = sine_sum;
   countdown_ = countdown;
+}
+
+void ToneStrengthFilter::ProcessAll(ToneStrengthFilter* filters, int count,
+                                    const std::vector<float>& input, std::vector<float>* outputs) {
+  using audio_dsp::Float4;
+  typedef uint32_t UInt4 __attribute__((vector_size(16)));
+  CHECK(outputs);
+  bool lockstep = true;
+  for (int i = 1; i < count; ++i) {
+    lockstep = lockstep && filters[i].decimation_factor_ == filters[0].decimation_factor_ &&
+               filters[i].countdown_ == filters[0].countdown_;
+  }
+  if (!lockstep) {
+    for (int i = 0; i < count; ++i) filters[i].Process(input, &outputs[i]);
+    return;
+  }
+  // Sized for the most strengths the input can complete and cut to what it
+  // did: no call inside the loop, so the vectors stay in registers.
+  const size_t most = input.size() / filters[0].decimation_factor_ + 1;
+  for (int i = 0; i < count; ++i) outputs[i].resize(most);
+  size_t produced = 0;
+  // Four filters per vector, lane l being filter first + l: each lane does
+  // Process's arithmetic in its order. Lanes beyond the last filter run on a
+  // zero increment and gain and are not written back.
+  for (int first = 0; first < count; first += 4) {
+    const int lanes = std::min(4, count - first);
+    const ToneStrengthFilter* f = filters + first;
+    UInt4 phase = {}, increment = {};
+    Float4 cosine_sum = {}, sine_sum = {}, gain = {}, i1 = {}, q1 = {}, i2 = {}, q2 = {};
+    for (int l = 0; l < lanes; ++l) {
+      phase[l] = f[l].phase_;
+      increment[l] = f[l].phase_increment_;
+      cosine_sum[l] = f[l].cosine_sum_;
+      sine_sum[l] = f[l].sine_sum_;
+      gain[l] = f[l].gain_;
+      i1[l] = f[l].i1_;
+      q1[l] = f[l].q1_;
+      i2[l] = f[l].i2_;
+      q2[l] = f[l].q2_;
+    }
+    const float* const table = f[0].sine_table_;
+    const int32_t decimation = f[0].decimation_factor_;
+    int32_t countdown = f[0].countdown_;
+    float* out[4];
+    for (int l = 0; l < 4; ++l) out[l] = outputs[first + std::min(l, lanes - 1)].data();
+    size_t written = 0;
+    const float* samples = input.data();
+    size_t remaining = input.size();
+    while (remaining > 0) {
+      const int32_t run = static_cast<int32_t>(std::min<size_t>(remaining, countdown));
+      for (int32_t j = 0; j < run; ++j) {
+        const float x = samples[j];
+        const UInt4 index = phase >> kPhaseShift;
+        const Float4 cosine = {table[index[0] + kQuarterPeriod], table[index[1] + kQuarterPeriod],
+                               table[index[2] + kQuarterPeriod], table[index[3] + kQuarterPeriod]};
+        const Float4 sine = {table[index[0]], table[index[1]], table[index[2]], table[index[3]]};
+        cosine_sum += cosine * x;
+        sine_sum += x * sine;
+        phase += increment;
+      }
+      samples += run;
+      remaining -= run;
+      countdown -= run;
+      if (countdown == 0) {
+        const Float4 in_phase = cosine_sum, quadrature = sine_sum;
+        cosine_sum = Float4{};
+        sine_sum = Float4{};
+        countdown = decimation;
+        i1 += (in_phase - i1) * gain;
+        q1 += (quadrature - q1) * gain;
+        i2 += (i1 - i2) * gain;
+        q2 += (q1 - q2) * gain;
+        const Float4 strength = i2 * i2 + q2 * q2;
+        // Lanes beyond the last filter write into the last filter's output
+        // before its own lane does (highest lane first).
+        out[3][written] = strength[3];
+        out[2][written] = strength[2];
+        out[1][written] = strength[1];
+        out[0][written] = strength[0];
+        ++written;
+      }
+    }
+    produced = written;
+    for (int l = 0; l < lanes; ++l) {
+      ToneStrengthFilter& filter = filters[first + l];
+      filter.phase_ = phase[l];
+      filter.cosine_sum_ = cosine_sum[l];
+      filter.sine_sum_ = sine_sum[l];
+      filter.countdown_ = countdown;
+      filter.i1_ = i1[l];
+      filter.q1_ = q1[l];
+      filter.i2_ = i2[l];
+      filter.q2_ = q2[l];
+    }
+  }
+  for (int i = 0; i < count; ++i) outputs[i].resize(produced);
 }
 
 void ToneStrengthFilter::Reset() {

@@ -34,6 +34,14 @@ class ToneStrengthFilter {
   // already has room for input.size() / decimation_factor + 1 values.
   void Process(const std::vector<float>& input, std::vector<float>* output_samples);
 
+  // Process for each of `count` filters over the same input, writing filter
+  // i's strengths to outputs[i]: exactly what calling each one's Process
+  // gives. Filters that share their decimation factor and the position in
+  // their group (filters reset together and fed alike) run side by side,
+  // four per vector; others run one after another.
+  static void ProcessAll(ToneStrengthFilter* filters, int count, const std::vector<float>& input,
+                         std::vector<float>* outputs);
+
   // Forgets the partial group and the low-pass state; the oscillator phase
   // runs on.
   void Reset();

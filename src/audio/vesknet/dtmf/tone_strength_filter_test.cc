@@ -51,6 +51,39 @@ TEST(ToneStrengthFilterTest, BlockSplitsDoNotMatter) {
   EXPECT_EQ(collected, expected);
 }
 
+// Filters run side by side give each filter's own strengths, bit for bit:
+// groups of four and a last partial group, blocks cut anywhere; filters that
+// are not in step (another decimation factor) run one by one.
+TEST(ToneStrengthFilterTest, ProcessAllEqualsEachFiltersProcess) {
+  const std::vector<float> input = Tone(1244.53, 3000, 2000);
+  for (int count : {1, 3, 4, 6, 10}) {
+    std::vector<ToneStrengthFilter> bank, alone;
+    for (int i = 0; i < count; ++i) {
+      const float frequency = 740.0f * (1.0f + 0.13f * i);
+      const int decimation = count == 3 && i == 1 ? 8 : 16;
+      bank.emplace_back(44100, frequency, 20.0f + i, decimation);
+      alone.emplace_back(44100, frequency, 20.0f + i, decimation);
+    }
+    std::vector<std::vector<float>> outputs(count), expected(count), collected(count);
+    size_t start = 0;
+    for (const size_t length : {5, 11, 0, 100, 1000, 1884}) {
+      const std::vector<float> block(input.begin() + start, input.begin() + start + length);
+      ToneStrengthFilter::ProcessAll(bank.data(), count, block, outputs.data());
+      for (int i = 0; i < count; ++i) {
+        std::vector<float> one;
+        alone[i].Process(block, &one);
+        expected[i].insert(expected[i].end(), one.begin(), one.end());
+        collected[i].insert(collected[i].end(), outputs[i].begin(), outputs[i].end());
+      }
+      start += length;
+    }
+    for (int i = 0; i < count; ++i) {
+      EXPECT_EQ(collected[i], expected[i]) << count << " filters, filter " << i;
+      EXPECT_GE(expected[i].size(), input.size() / 16);
+    }
+  }
+}
+
 // Frequency 0: the cosine arm passes the input, the sine arm gives 0, so with
 // decimation 1 each strength is the input after two low-pass stages, squared.
 TEST(ToneStrengthFilterTest, DecimationOneAtFrequencyZero) {

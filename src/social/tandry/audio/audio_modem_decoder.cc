@@ -2,10 +2,13 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstring>
 #include <limits>
 #include <utility>
 
+#include "audio/dsp/pcm_conversion.h"
 #include "audio/vesknet/crc16_coder.h"
+#include "audio/vesknet/vesknet_util.h"
 #include "base/logging.h"
 #include "social/tandry/audio/config_limits.h"
 
@@ -44,6 +47,19 @@ void AudioModemDecoder::ProcessSamples(const std::vector<float>& samples) {
     zintar_decoder_->ProcessSamples(raw_.data(), static_cast<int>(raw_.size()));
   }
   if (kind_ == kDtmf) dtmf_decoder_->ProcessSamples(samples);
+}
+
+void AudioModemDecoder::ProcessPcm16(const int16_t* samples, int count) {
+  if (count <= 0) return;  // Nothing to hear (and nothing to copy).
+  if (kind_ == kZintar) {
+    // The listening mode may mix the block down in place: give it a copy.
+    raw_.resize(count);
+    std::memcpy(raw_.data(), samples, sizeof(int16_t) * static_cast<size_t>(count));
+    zintar_decoder_->ProcessSamples(raw_.data(), count);
+    return;
+  }
+  audio_dsp::Pcm16ToFloats(samples, count, &samples_);
+  ProcessSamples(samples_);
 }
 
 void AudioModemDecoder::ProcessSamplesWithZintar(int16_t* samples, int count) {
@@ -171,6 +187,26 @@ std::string HistoryError(double token_seconds, float buffer_length_tokens) {
   return std::string();
 }
 
+// Floats of acquisition history of a DSSS decoder of `config` with the
+// default tuning, computed as the decoder sizes it.
+int64_t AcquisitionFloats(const DsssDecoderConfig& config) {
+  const audio_vesknet::VesknetDecoderParams tuning;
+  const DsssWaveformConfig& w = config.waveform;
+  const int frame = ((1 << w.number_of_taps) - 1) * w.upsampling_factor;
+  const int cycles = audio_vesknet::SymbolWaveCoder::CarrierCyclesPerFrame(frame, w.sample_rate,
+                                                                           w.carrier_frequency);
+  std::vector<float> shifts;
+  audio_vesknet::MakeFrequencyOffsets(
+      tuning.acquisition_doppler_step,
+      audio_vesknet::VesknetDecoder::MaxDopplerShift(cycles, tuning), &shifts);
+  const float baseband_rate = w.sample_rate / w.baseband_decimation_factor;
+  const int window =
+      static_cast<int>(std::round(config.acquisition_window_seconds * baseband_rate));
+  return audio_vesknet::AcquisitionScorer::HistoryFloats(
+      frame / w.baseband_decimation_factor, static_cast<int>(shifts.size()),
+      static_cast<float>(tuning.noise_smoothing_length), window);
+}
+
 }  // namespace
 
 std::string DsssDecoderConfigError(const DsssDecoderConfig& config) {
@@ -181,6 +217,11 @@ std::string DsssDecoderConfigError(const DsssDecoderConfig& config) {
   if (!waveform_error.empty()) return waveform_error;
   if (!(config.acquisition_window_seconds > 0 && config.acquisition_window_seconds <= 60)) {
     return "the acquisition window must lie in (0, 60] seconds";
+  }
+  if (AcquisitionFloats(config) > kMaxAcquisitionFloats) {
+    return "the acquisition window and the Doppler search would take more than " +
+           std::to_string(kMaxAcquisitionFloats * 4 >> 20) +
+           " MiB: shorten the window or lower the carrier's cycles per frame";
   }
   if (config.max_tokens_per_call < 1 ||
       config.max_tokens_per_call > audio_vesknet::VesknetDecoderParams().max_candidates_rank) {

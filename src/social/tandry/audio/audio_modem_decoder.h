@@ -52,6 +52,11 @@ class AudioModemDecoder {
   // Interleaved samples in the 16-bit range, as floats (the zintar kind
   // truncates them back to 16-bit values).
   void ProcessSamples(const std::vector<float>& samples);
+  // Interleaved 16-bit samples (read byte-wise: no alignment assumed), for
+  // every kind: what ProcessSamples does with them as floats, converted into
+  // a buffer that this object keeps, so that a block costs no allocation once
+  // the buffer has reached the block size.
+  void ProcessPcm16(const int16_t* samples, int count);
   // Raw 16-bit samples for the zintar listening mode; other kinds ignore them.
   // The buffer may be overwritten (mixed down in place).
   void ProcessSamplesWithZintar(int16_t* samples, int count);
@@ -83,7 +88,8 @@ class AudioModemDecoder {
   std::unique_ptr<ZintarDecoder> zintar_decoder_;
   std::unique_ptr<audio_vesknet::DtmfDecoder> dtmf_decoder_;
   Kind kind_;
-  std::vector<int16_t> raw_;  // Scratch for the zintar kind.
+  std::vector<int16_t> raw_;    // Scratch for the zintar kind.
+  std::vector<float> samples_;  // ProcessPcm16's samples as floats.
   int token_size_;
 };
 

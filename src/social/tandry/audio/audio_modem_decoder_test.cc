@@ -47,6 +47,34 @@ TEST(AudioModemDecoderTest, VerifiesAndStripsCrcBytes) {
   EXPECT_TRUE(std::equal(kMessage.begin(), kMessage.end(), results.tokens[0].bytes.begin()));
 }
 
+// 16-bit blocks are taken as their float values would be, for every kind.
+TEST(AudioModemDecoderTest, SixteenBitBlocksAreTheirFloatValues) {
+  std::vector<int16_t> pcm;
+  std::vector<float> played;
+  for (const float sample : Played(kMessage, 2)) {
+    pcm.push_back(static_cast<int16_t>(sample));
+    played.push_back(pcm.back());
+  }
+  DsssDecoderConfig zintar;
+  zintar.input_sample_rate = 48000;
+  zintar.use_zintar = true;
+  for (const bool listening : {false, true}) {
+    const auto floats = listening ? MakeDsssAudioModemDecoder(zintar) : Decoder();
+    const auto ints = listening ? MakeDsssAudioModemDecoder(zintar) : Decoder();
+    for (size_t start = 0; start < pcm.size(); start += 4096) {
+      const size_t end = std::min(pcm.size(), start + 4096);
+      floats->ProcessSamples(std::vector<float>(played.begin() + start, played.begin() + end));
+      ints->ProcessPcm16(pcm.data() + start, static_cast<int>(end - start));
+    }
+    DecodeResults a, b;
+    ASSERT_TRUE(floats->GetTokens(&a, 6, 2));
+    ASSERT_TRUE(ints->GetTokens(&b, 6, 2));
+    EXPECT_EQ(a.tokens[0].bytes, b.tokens[0].bytes);
+    EXPECT_EQ(a.frame_times, b.frame_times);
+    EXPECT_EQ(a.frame_scores, b.frame_scores);
+  }
+}
+
 TEST(AudioModemDecoderTest, TokensFailingTheCrcAreDropped) {
   const auto decoder = Decoder();
   // Eight bytes whose last two are not the CRC of the first six.
@@ -147,11 +175,22 @@ TEST(AudioModemDecoderTest, ConfigLimitsAreInclusive) {
          c->waveform.number_of_taps = 11;
          c->waveform.upsampling_factor = out ? 33 : 32;
          c->waveform.baseband_decimation_factor = 1;
+         c->waveform.carrier_frequency = 1000;  // Few Doppler shifts to search.
          c->buffer_length_tokens = 1;
        },
        "a frame (code length x upsampling factor) may hold at most 65536 samples"},
       {[](DsssDecoderConfig* c, bool out) { c->waveform.sample_rate = out ? 384001 : 384000; },
        "the coder sample rate must lie in (0, 384000] Hz"},
+      // 11 taps at 48 kHz: 12623 carrier cycles per frame, 179 Doppler shifts
+      // (192 per history row); a 5 s window needs 65536 rows (48 MiB), 6 s
+      // need 131072 (96 MiB).
+      {[](DsssDecoderConfig* c, bool out) {
+         c->waveform.number_of_taps = 11;
+         c->buffer_length_tokens = 1;
+         c->acquisition_window_seconds = out ? 6 : 5;
+       },
+       "the acquisition window and the Doppler search would take more than 64 MiB: shorten the "
+       "window or lower the carrier's cycles per frame"},
   };
   for (const Case& c : cases) {
     DsssDecoderConfig config;
@@ -163,6 +202,16 @@ TEST(AudioModemDecoderTest, ConfigLimitsAreInclusive) {
   DtmfDecoderConfig dtmf;
   dtmf.bytes_in_token = 257;
   EXPECT_EQ(DtmfDecoderConfigError(dtmf), "the token must have 1 to 256 bytes");
+  // The product waveform's history fills exactly 2^24 floats with a 60 s window.
+  DsssDecoderConfig product;
+  product.acquisition_window_seconds = 60;
+  EXPECT_EQ(DsssDecoderConfigError(product), "");
+  dtmf = DtmfDecoderConfig();
+  dtmf.tone_frequencies.resize(64);
+  for (int i = 0; i < 64; ++i) dtmf.tone_frequencies[i] = 500.0f + 100.0f * i;
+  EXPECT_EQ(DtmfDecoderConfigError(dtmf), "");
+  dtmf.tone_frequencies.push_back(9000);
+  EXPECT_EQ(DtmfDecoderConfigError(dtmf), "a tone set may have at most 64 tones");
   dtmf = DtmfDecoderConfig();
   dtmf.sample_rate = 384001;
   EXPECT_EQ(DtmfDecoderConfigError(dtmf), "the sample rate must lie in (0, 384000] Hz");

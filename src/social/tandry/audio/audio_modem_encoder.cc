@@ -81,6 +81,11 @@ std::string DsssEncoderConfigError(const DsssEncoderConfig& config) {
     return "the broadcast sample rate must lie in [1, " + std::to_string(int(kMaxSampleRateHz)) +
            "] Hz";
   }
+  if (DsssTokenSeconds(config.waveform, config.token_length_bytes, config.append_checksum_symbol) *
+          config.broadcast_sample_rate <
+      1.0) {
+    return "a token must last at least one sample at the broadcast rate";
+  }
   if (!(config.waveform.carrier_frequency < config.broadcast_sample_rate / 2.0f)) {
     return "the carrier (" + std::to_string(int(config.waveform.carrier_frequency)) +
            " Hz) must lie below half the broadcast sample rate";

@@ -93,6 +93,22 @@ TEST(AudioModemEncoderTest, ConfigErrorsAreSentencesNotAborts) {
             "the carrier (18500 Hz) must lie below half the broadcast sample rate");
   config.broadcast_sample_rate = 384001;
   EXPECT_EQ(DsssEncoderConfigError(config), "the broadcast sample rate must lie in [1, 384000] Hz");
+  // A token must leave at least one sample at the broadcast rate: the
+  // shortest one (5 taps, upsampling 1, 1 byte of 8 one-bit symbols and the
+  // sync: 279 samples at 48 kHz, 5.8 ms) needs 172 Hz.
+  config = DsssEncoderConfig();
+  config.token_length_bytes = 1;
+  config.waveform.number_of_taps = 5;
+  config.waveform.upsampling_factor = 1;
+  config.waveform.baseband_decimation_factor = 1;
+  config.waveform.bits_per_symbol = 1;
+  config.waveform.carrier_frequency = 10;
+  EXPECT_DOUBLE_EQ(DsssTokenSeconds(config.waveform, 1, false), 9 * 31 / 48000.0);
+  config.broadcast_sample_rate = 173;
+  EXPECT_EQ(DsssEncoderConfigError(config), "");
+  config.broadcast_sample_rate = 171;
+  EXPECT_EQ(DsssEncoderConfigError(config),
+            "a token must last at least one sample at the broadcast rate");
   // A transition of 2e8 s once overflowed its sample count.
   config = DsssEncoderConfig();
   config.transition_duration = 1;

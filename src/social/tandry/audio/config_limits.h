@@ -8,6 +8,8 @@
 #ifndef SOCIAL_TANDRY_AUDIO_CONFIG_LIMITS_H_
 #define SOCIAL_TANDRY_AUDIO_CONFIG_LIMITS_H_
 
+#include <cstdint>
+
 namespace audio_modem {
 
 // Bytes per token, check bytes included: a 256-byte DSSS token already
@@ -23,6 +25,13 @@ constexpr int kMaxChannels = 64;
 // encoder and a decoder take (a minute of 384 kHz audio is 90 MiB of floats).
 constexpr double kMaxTokenSeconds = 30.0;
 constexpr double kMaxHistorySeconds = 60.0;
+// Floats of acquisition history a DSSS decoder may keep (64 MiB): the
+// acquisition window times the Doppler shifts searched, which grow with the
+// baseband rate and with the carrier's cycles per frame.
+constexpr int64_t kMaxAcquisitionFloats = int64_t{1} << 24;
+// Tones of a DTMF tone set: its decoder follows every tone over the whole
+// history (the default set has ten).
+constexpr int kMaxDtmfTones = 64;
 // Coder samples per DSSS frame (code length x upsampling factor): 11 taps
 // at upsampling 32. Longer frames make tokens of minutes.
 constexpr int kMaxDsssFrameSamples = 65536;

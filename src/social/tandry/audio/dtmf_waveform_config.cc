@@ -53,6 +53,9 @@ std::string DtmfWaveformConfigError(const DtmfWaveformConfig& config) {
   }
   const std::vector<float>& tones =
       default_tones ? params.tone_frequencies : config.tone_frequencies;
+  if (tones.size() > static_cast<size_t>(kMaxDtmfTones)) {
+    return "a tone set may have at most " + std::to_string(kMaxDtmfTones) + " tones";
+  }
   for (const float frequency : tones) {
     if (!(frequency >= 0 && frequency < config.sample_rate * 0.5f)) {
       return "every tone must lie in [0, sample_rate / 2) Hz";

@@ -4,6 +4,8 @@
 #include <stdlib.h>
 #include <string.h>
 
+#include "audio/dsp/simd.h"
+
 namespace {
 
 constexpr int32_t kMaxBlockSize = 2048;
@@ -142,16 +144,9 @@ bool IsValidConfig(const ZintarConfig* config) {
   return true;
 }
 
-// Four floats in one register where the target has one (SSE on x86, NEON on
-// ARM); GCC and Clang lower it to scalar code elsewhere. Loads and stores go
-// through memcpy, so no alignment is assumed.
-typedef float Float4 __attribute__((vector_size(16)));
-
-inline Float4 Load4(const float* p) {
-  Float4 v;
-  memcpy(&v, p, sizeof(v));
-  return v;
-}
+using audio_dsp::Float4;
+using audio_dsp::Load4;
+using audio_dsp::Store4;
 
 // One 7-tap kernel output for the complex samples x[0 ... 6] (interleaved),
 // applied to re and im separately. The low half of each load holds the tap's
@@ -266,8 +261,6 @@ void Radix2Pass(int32_t n, float* data) {
     data[i + 3] = im - data[i + 3];
   }
 }
-
-inline void Store4(float* p, Float4 v) { memcpy(p, &v, sizeof(v)); }
 
 // (re0, im0, re1, im1) -> (im0, re0, im1, re1).
 inline Float4 SwapPairs(Float4 v) { return Float4{v[1], v[0], v[3], v[2]}; }

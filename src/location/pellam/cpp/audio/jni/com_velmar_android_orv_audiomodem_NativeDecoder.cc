@@ -8,11 +8,10 @@
 
 #include <jni.h>
 
+#include <algorithm>
 #include <cstdint>
-#include <cstring>
 #include <memory>
 #include <utility>
-#include <vector>
 
 #include "base/logging.h"
 #include "location/pellam/cpp/audio/jni/decoder_registry.h"
@@ -126,14 +125,9 @@ JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nati
   const int16_t* pcm = SamplesOf(env, buffer, offset, length, &count);
   AudioModemDecoder* decoder = FindDecoder(id, "nativeProcessSamples()");
   if (decoder == nullptr) return;
-  // 16-bit values as floats, unscaled: the decoders work in the 16-bit range.
-  std::vector<float> samples(count);
-  for (int i = 0; i < count; ++i) {
-    int16_t value;
-    std::memcpy(&value, pcm + i, sizeof(value));
-    samples[i] = value;
-  }
-  decoder->ProcessSamples(samples);
+  // 16-bit values as floats, unscaled (the decoders work in the 16-bit
+  // range), in a buffer that the decoder keeps.
+  decoder->ProcessPcm16(pcm, count);
 }
 
 JNIEXPORT void JNICALL
@@ -195,7 +189,11 @@ Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeGetMaxSafeInputSize(J
                                                                                jobject /*thiz*/,
                                                                                jint id) {
   AudioModemDecoder* decoder = FindDecoder(id, "nativeGetMaxSafeInputSize()");
-  return decoder == nullptr ? 0 : decoder->GetMaxSafeInputSize() * 2;
+  if (decoder == nullptr) return 0;
+  // In bytes, as far as a Java int counts: a huge history's size would
+  // overflow the doubling.
+  return static_cast<jint>(
+      std::min<int64_t>(int64_t{2} * decoder->GetMaxSafeInputSize(), INT32_MAX));
 }
 
 JNIEXPORT void JNICALL Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeRelease(

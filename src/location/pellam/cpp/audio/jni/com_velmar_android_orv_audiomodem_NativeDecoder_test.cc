@@ -30,10 +30,26 @@ TEST(NativeDecoderTest, ListeningModeTakesBuffersAtOddAddresses) {
     std::vector<int16_t> mixed(4);
     std::memcpy(mixed.data(), start, 2 * mixed.size());
     EXPECT_EQ(mixed, (std::vector<int16_t>{15, 35, -1, 100})) << "shift " << shift;
-    // An empty region at an odd address is nothing to hear.
+    // An empty region at an odd address is nothing to hear, on either path.
     Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeProcessSamplesWithZintar(
         jni.env(), thiz, 0, jni.DirectBuffer(start, 0), 0, 0);
+    Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeProcessSamples(
+        jni.env(), thiz, 0, jni.DirectBuffer(start, 0), 0, 0);
   }
+  Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeRelease(jni.env(), thiz, 0);
+}
+
+// The safe input size in bytes stops at the largest Java int: a DTMF decoder
+// of 64 channels at 384 kHz holds 50 s of history, 1.2e9 samples.
+TEST(NativeDecoderTest, SafeInputSizeInBytesDoesNotOverflow) {
+  FakeJniEnv jni;
+  jobject thiz = jni.PlainObject();
+  ASSERT_TRUE(Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeInitializeDtmf(
+      jni.env(), thiz, 0, 5, true, 44100, 16, 0.05f, 2, 0, 2, 384000, 64, 0.025f, 0, 0, 0.025f, 1,
+      100.0f, jni.FloatArray({})));
+  EXPECT_EQ(Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeGetMaxSafeInputSize(
+                jni.env(), thiz, 0),
+            INT32_MAX);
   Java_com_velmar_android_orv_audiomodem_NativeDecoder_nativeRelease(jni.env(), thiz, 0);
 }
 

@@ -41,17 +41,19 @@ public final class DecoderOptions {
     return new Builder();
   }
 
-  /** Sample rate of the microphone input, Hz, at least 1000. */
+  /** Sample rate of the microphone input, Hz, 1000 to 384000. */
   public int microphoneRate() {
     return microphoneRate;
   }
 
-  /** Interleaved channels of the microphone input, at least 1. */
+  /** Interleaved channels of the microphone input, 1 to 64. */
   public int channels() {
     return channels;
   }
 
-  /** Span of acquisition scores that broadcaster detection integrates, seconds, positive. DSSS. */
+  /**
+   * Span of acquisition scores that broadcaster detection integrates, seconds, in (0, 60]. DSSS.
+   */
   public float acquisitionWindowSeconds() {
     return acquisitionWindowSeconds;
   }
@@ -61,7 +63,9 @@ public final class DecoderOptions {
     return broadcasterThreshold;
   }
 
-  /** Input history that the decoder keeps, in token durations, at least 1. */
+  /**
+   * Input history that the decoder keeps, in token durations, 1 to 100 and at most 60 s of audio.
+   */
   public float bufferLengthTokens() {
     return bufferLengthTokens;
   }
@@ -82,7 +86,7 @@ public final class DecoderOptions {
   }
 
   /** Lowest microphone rate at which the listening mode's 18496 Hz detector fits below Nyquist. */
-  public static final int MIN_LISTENING_RATE = 36994;
+  public static final int MIN_LISTENING_RATE = Limits.MIN_LISTENING_RATE_HZ;
 
   public static final class Builder {
     private int microphoneRate = 44100;
@@ -96,13 +100,13 @@ public final class DecoderOptions {
 
     private Builder() {}
 
-    /** Microphone sample rate, Hz, at least 1000 (default 44100). */
+    /** Microphone sample rate, Hz, 1000 to 384000 (default 44100). */
     public Builder microphoneRate(int hertz) {
       microphoneRate = hertz;
       return this;
     }
 
-    /** Interleaved microphone channels, at least 1; mixed to mono (default 1). */
+    /** Interleaved microphone channels, 1 to 64; mixed to mono (default 1). */
     public Builder channels(int count) {
       channels = count;
       return this;
@@ -110,7 +114,7 @@ public final class DecoderOptions {
 
     /**
      * Span of acquisition scores that {@link TokenDecoder#broadcasterDetected()} integrates,
-     * seconds, positive (default 0.75). DSSS only.
+     * seconds, in (0, 60] (default 0.75). DSSS only.
      */
     public Builder acquisitionWindowSeconds(float seconds) {
       acquisitionWindowSeconds = seconds;
@@ -126,7 +130,10 @@ public final class DecoderOptions {
       return this;
     }
 
-    /** History kept, in token durations, at least 1 (default 4; 2 loses about 1 dB). */
+    /**
+     * History kept, in token durations, 1 to 100 (default 4; 2 loses about 1 dB). The decoder's
+     * factory also refuses a history of more than 60 s (this times the token's duration).
+     */
     public Builder bufferLengthTokens(float tokens) {
       bufferLengthTokens = tokens;
       return this;
@@ -164,13 +171,32 @@ public final class DecoderOptions {
      * @throws IllegalArgumentException naming the first value outside its range
      */
     public DecoderOptions build() {
-      require(microphoneRate >= 1000, "microphoneRate must be at least 1000 Hz");
-      require(channels >= 1, "channels must be at least 1");
-      require(acquisitionWindowSeconds > 0, "acquisitionWindowSeconds must be positive");
-      require(bufferLengthTokens >= 1, "bufferLengthTokens must be at least 1");
-      require(maxTokensPerCall >= 1 && maxTokensPerCall <= 6, "maxTokensPerCall must be 1 to 6");
+      // MicrophoneError (audio_modem_decoder.cc), which both decoder kinds apply.
+      require(microphoneRate >= Limits.MIN_MICROPHONE_RATE_HZ
+              && microphoneRate <= Limits.MAX_SAMPLE_RATE_HZ,
+          "microphoneRate must be " + Limits.MIN_MICROPHONE_RATE_HZ + " to "
+              + (int) Limits.MAX_SAMPLE_RATE_HZ + " Hz, not " + microphoneRate);
+      require(channels >= 1 && channels <= Limits.MAX_CHANNELS,
+          "channels must be 1 to " + Limits.MAX_CHANNELS + ", not " + channels);
+      // DsssDecoderConfigError (audio_modem_decoder.cc).
+      require(acquisitionWindowSeconds > 0
+              && acquisitionWindowSeconds <= Limits.MAX_ACQUISITION_WINDOW_SECONDS,
+          "acquisitionWindowSeconds must lie in (0, " + (int) Limits.MAX_ACQUISITION_WINDOW_SECONDS
+              + "], not " + acquisitionWindowSeconds);
+      // HistoryError (audio_modem_decoder.cc); the factories of TokenDecoder check the history's
+      // duration, which depends on the transmitter's configuration too.
+      require(bufferLengthTokens >= Limits.MIN_BUFFER_LENGTH_TOKENS
+              && bufferLengthTokens <= Limits.MAX_BUFFER_LENGTH_TOKENS,
+          "bufferLengthTokens must lie in [" + (int) Limits.MIN_BUFFER_LENGTH_TOKENS + ", "
+              + (int) Limits.MAX_BUFFER_LENGTH_TOKENS + "], not " + bufferLengthTokens);
+      // DsssDecoderConfigError and DtmfDecoderConfigError (audio_modem_decoder.cc).
+      require(maxTokensPerCall >= 1 && maxTokensPerCall <= Limits.MAX_TOKENS_PER_CALL,
+          "maxTokensPerCall must be 1 to " + Limits.MAX_TOKENS_PER_CALL + ", not "
+              + maxTokensPerCall);
+      // DsssDecoderConfigError (audio_modem_decoder.cc), through the detector it asks for.
       require(!listeningMode || microphoneRate >= MIN_LISTENING_RATE,
-          "the listening mode needs a microphone rate of at least " + MIN_LISTENING_RATE + " Hz");
+          "the listening mode needs a microphone rate of at least " + MIN_LISTENING_RATE
+              + " Hz, not " + microphoneRate);
       return new DecoderOptions(this);
     }
   }

@@ -81,7 +81,7 @@ public final class DsssConfig {
     return b;
   }
 
-  /** Message bytes per token, without check bytes: at least 1. */
+  /** Message bytes per token, without check bytes: 1 to 256 less the check bytes. */
   public int messageBytes() {
     return messageBytes;
   }
@@ -116,19 +116,22 @@ public final class DsssConfig {
     return codeNumber;
   }
 
-  /** Sample rate at which the symbols are synthesised, Hz, positive. */
+  /** Sample rate at which the symbols are synthesised, Hz, in (0, 384000]. */
   public float coderSampleRate() {
     return coderSampleRate;
   }
 
-  /** Coder samples per chip, positive and a multiple of {@link #basebandDecimationFactor()}. */
+  /**
+   * Coder samples per chip, positive and a multiple of {@link #basebandDecimationFactor()}; a
+   * frame ({@link #frameSize()}) holds at most 65536 samples.
+   */
   public int upsamplingFactor() {
     return upsamplingFactor;
   }
 
   /**
-   * Requested carrier, Hz, in (0, coder sample rate / 2]; the coder snaps it to a whole number of
-   * cycles per frame.
+   * Requested carrier, Hz, in (0, coder sample rate / 2] and below half the broadcast sample rate;
+   * the coder snaps it to a whole number of cycles per frame.
    */
   public float carrierFrequency() {
     return carrierFrequency;
@@ -154,29 +157,49 @@ public final class DsssConfig {
     return quadratureCarrier;
   }
 
-  /** Sample rate of the encoded audio handed to the loudspeaker, Hz, positive. */
+  /**
+   * Sample rate of the encoded audio handed to the loudspeaker, Hz, 1 to 384000 and above twice the
+   * carrier.
+   */
   public int broadcastSampleRate() {
     return broadcastSampleRate;
   }
 
-  /** Length of the fade-in played before the first repetition, seconds, at least 0. */
+  /** Length of the fade-in played before the first repetition, seconds, 0 to 1. */
   public float transitionSeconds() {
     return transitionSeconds;
   }
 
   /** Coder samples per symbol: code length x upsampling factor. */
   public int frameSize() {
-    return ((1 << numberOfTaps) - 1) * upsamplingFactor;
+    return codeLength(numberOfTaps) * upsamplingFactor;
   }
 
   /** Symbols in one token on air: sync, data and, when enabled, checksum. */
   public int framesPerToken() {
-    return 1 + (8 / bitsPerSymbol) * tokenLengthBytes() + (checksumSymbol ? 1 : 0);
+    return framesPerToken(tokenLengthBytes(), checksumSymbol, bitsPerSymbol);
   }
 
-  /** Duration of one token on air, seconds. */
+  /** Duration of one token on air, seconds, at most 30. */
   public double tokenSeconds() {
-    return (double) framesPerToken() * frameSize() / coderSampleRate;
+    return tokenSeconds(tokenLengthBytes(), checksumSymbol, bitsPerSymbol, numberOfTaps,
+        upsamplingFactor, coderSampleRate);
+  }
+
+  private static int codeLength(int numberOfTaps) {
+    return (1 << numberOfTaps) - 1;
+  }
+
+  private static int framesPerToken(int tokenBytes, boolean checksumSymbol, int bitsPerSymbol) {
+    return 1 + (8 / bitsPerSymbol) * tokenBytes + (checksumSymbol ? 1 : 0);
+  }
+
+  // As DsssTokenSeconds (dsss_waveform_config.cc) computes it, so that the limit on it cuts where
+  // the native check does.
+  private static double tokenSeconds(int tokenBytes, boolean checksumSymbol, int bitsPerSymbol,
+      int numberOfTaps, int upsamplingFactor, float coderSampleRate) {
+    return (double) framesPerToken(tokenBytes, checksumSymbol, bitsPerSymbol)
+        * codeLength(numberOfTaps) * upsamplingFactor / coderSampleRate;
   }
 
   /** Builder with the product defaults. */
@@ -199,7 +222,10 @@ public final class DsssConfig {
 
     private Builder() {}
 
-    /** Message bytes per token, without check bytes: at least 1 (default 6). */
+    /**
+     * Message bytes per token, without check bytes: 1 to 256 less the check bytes, and few enough
+     * that a token lasts at most 30 s on air (default 6).
+     */
     public Builder messageBytes(int value) {
       messageBytes = value;
       return this;
@@ -234,8 +260,9 @@ public final class DsssConfig {
     }
 
     /**
-     * The coder: its sample rate (Hz, positive), samples per chip (positive) and baseband
-     * decimation (positive, dividing the samples per chip). Default 48000 Hz, 16, 4.
+     * The coder: its sample rate (Hz, in (0, 384000]), samples per chip (positive, at most 65536
+     * per frame) and baseband decimation (positive, dividing the samples per chip). Default 48000
+     * Hz, 16, 4.
      */
     public Builder coder(float sampleRate, int upsamplingFactor, int basebandDecimationFactor) {
       coderSampleRate = sampleRate;
@@ -249,7 +276,10 @@ public final class DsssConfig {
       return coder(44100f, 15, 3);
     }
 
-    /** Requested carrier, Hz, in (0, coder sample rate / 2] (default 18500). */
+    /**
+     * Requested carrier, Hz, in (0, coder sample rate / 2] and below half the broadcast sample rate
+     * (default 18500).
+     */
     public Builder carrierFrequency(float hertz) {
       carrierFrequency = hertz;
       return this;
@@ -273,13 +303,16 @@ public final class DsssConfig {
       return this;
     }
 
-    /** Sample rate of the encoded audio, Hz, positive (default 48000). */
+    /**
+     * Sample rate of the encoded audio, Hz, 1 to 384000 and above twice the carrier (default
+     * 48000).
+     */
     public Builder broadcastSampleRate(int hertz) {
       broadcastSampleRate = hertz;
       return this;
     }
 
-    /** Length of the fade-in before the first repetition, seconds, at least 0 (default 0.005). */
+    /** Length of the fade-in before the first repetition, seconds, 0 to 1 (default 0.005). */
     public Builder transitionSeconds(float seconds) {
       transitionSeconds = seconds;
       return this;
@@ -291,22 +324,52 @@ public final class DsssConfig {
      * @throws IllegalArgumentException naming the first value outside its range
      */
     public DsssConfig build() {
-      require(messageBytes >= 1, "messageBytes must be at least 1");
-      require(numberOfTaps >= 5 && numberOfTaps <= 11, "numberOfTaps must be 5 to 11");
+      // The token: DsssEncoderConfigError and DsssDecoderConfigError (audio_modem_*.cc).
+      int maxMessageBytes = Limits.MAX_TOKEN_BYTES - crcCheckBytes;
+      require(messageBytes >= 1 && messageBytes <= maxMessageBytes,
+          "messageBytes must be 1 to " + maxMessageBytes + (crcCheckBytes > 0 ? " with CRC" : "")
+              + ", not " + messageBytes);
+      // The waveform: DsssWaveformConfigError (dsss_waveform_config.cc).
+      require(numberOfTaps >= Limits.MIN_TAPS && numberOfTaps <= Limits.MAX_TAPS,
+          "numberOfTaps must be " + Limits.MIN_TAPS + " to " + Limits.MAX_TAPS);
       require(codeNumber >= 0 && codeNumber <= (numberOfTaps <= 6 ? 2 : 3),
           "codeNumber must be 0 to 2 for 5 or 6 taps, 0 to 3 otherwise");
-      require(coderSampleRate > 0, "coder sample rate must be positive");
+      require(coderSampleRate > 0 && coderSampleRate <= Limits.MAX_SAMPLE_RATE_HZ,
+          "the coder sample rate must lie in (0, " + (int) Limits.MAX_SAMPLE_RATE_HZ + "] Hz, not "
+              + coderSampleRate);
       require(upsamplingFactor > 0, "upsamplingFactor must be positive");
+      require((long) codeLength(numberOfTaps) * upsamplingFactor <= Limits.MAX_DSSS_FRAME_SAMPLES,
+          "a frame (code length " + codeLength(numberOfTaps)
+              + " x upsamplingFactor) may hold at most " + Limits.MAX_DSSS_FRAME_SAMPLES
+              + " samples");
       require(basebandDecimationFactor > 0, "basebandDecimationFactor must be positive");
       require(upsamplingFactor % basebandDecimationFactor == 0,
           "upsamplingFactor must be a multiple of basebandDecimationFactor");
       require(carrierFrequency > 0 && carrierFrequency <= coderSampleRate / 2,
-          "carrierFrequency must lie in (0, coder sample rate / 2]");
+          "carrierFrequency (" + carrierFrequency + " Hz) must lie in (0, coder sample rate / 2]");
       require(bitsPerSymbol == 1 || bitsPerSymbol == 2 || bitsPerSymbol == 4 || bitsPerSymbol == 8,
           "bitsPerSymbol must be 1, 2, 4 or 8");
       require(minCyclesPerFrame >= 0, "minCyclesPerFrame must not be negative");
-      require(broadcastSampleRate > 0, "broadcastSampleRate must be positive");
-      require(transitionSeconds >= 0, "transitionSeconds must not be negative");
+      // The transmitter: DsssEncoderConfigError (audio_modem_encoder.cc); receivers refuse the
+      // same token duration (HistoryError, audio_modem_decoder.cc).
+      double tokenSeconds = tokenSeconds(messageBytes + crcCheckBytes, checksumSymbol,
+          bitsPerSymbol, numberOfTaps, upsamplingFactor, coderSampleRate);
+      require(tokenSeconds <= Limits.MAX_TOKEN_SECONDS,
+          "a token may last at most " + (int) Limits.MAX_TOKEN_SECONDS + " s on air, not "
+              + tokenSeconds + " s");
+      require(broadcastSampleRate >= 1 && broadcastSampleRate <= Limits.MAX_SAMPLE_RATE_HZ,
+          "broadcastSampleRate must be 1 to " + (int) Limits.MAX_SAMPLE_RATE_HZ + " Hz, not "
+              + broadcastSampleRate);
+      require(tokenSeconds * broadcastSampleRate >= 1,
+          "a token must last at least one sample at the broadcast rate, not "
+              + tokenSeconds * broadcastSampleRate);
+      require(carrierFrequency < broadcastSampleRate / 2.0f,
+          "carrierFrequency (" + carrierFrequency
+              + " Hz) must lie below half the broadcast sample rate (" + broadcastSampleRate
+              + " Hz)");
+      require(transitionSeconds >= 0 && transitionSeconds <= Limits.MAX_TRANSITION_SECONDS,
+          "transitionSeconds must lie in [0, " + (int) Limits.MAX_TRANSITION_SECONDS + "], not "
+              + transitionSeconds);
       return new DsssConfig(this);
     }
   }

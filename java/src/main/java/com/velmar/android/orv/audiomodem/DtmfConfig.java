@@ -2,6 +2,7 @@ package com.velmar.android.orv.audiomodem;
 
 import static com.velmar.android.orv.audiomodem.Checks.require;
 
+import java.math.BigInteger;
 import java.util.Arrays;
 
 /**
@@ -53,7 +54,7 @@ public final class DtmfConfig {
     return new Builder();
   }
 
-  /** Message bytes per token, without check bytes: at least 1. */
+  /** Message bytes per token, without check bytes: 1 to 256 less the check bytes. */
   public int messageBytes() {
     return messageBytes;
   }
@@ -73,7 +74,7 @@ public final class DtmfConfig {
     return checksumSymbol;
   }
 
-  /** Sample rate of the modulation and of the encoded audio, Hz, positive. */
+  /** Sample rate of the modulation and of the encoded audio, Hz, in (0, 384000]. */
   public float sampleRate() {
     return sampleRate;
   }
@@ -105,8 +106,22 @@ public final class DtmfConfig {
 
   /** Samples per symbol: the window rounded to whole decimated samples. */
   public int frameSize() {
-    return Math.round(windowSeconds * sampleRate / basebandDecimationFactor)
-        * basebandDecimationFactor;
+    return frameSize(windowSeconds, sampleRate, basebandDecimationFactor);
+  }
+
+  /**
+   * Symbols in one token on air: the message and check bytes written in base (symbols - 1), the
+   * spacer and, when enabled, the checksum symbol.
+   */
+  public int framesPerToken() {
+    int tones =
+        toneFrequencies.length == 0 ? Limits.DEFAULT_DTMF_TONES.length : toneFrequencies.length;
+    return framesPerToken(symbolCount(tones, tonesPerSymbol), tokenLengthBytes(), checksumSymbol);
+  }
+
+  /** Duration of one token on air, seconds, at most 30. */
+  public double tokenSeconds() {
+    return (double) framesPerToken() * frameSize() / sampleRate;
   }
 
   /**
@@ -171,7 +186,10 @@ public final class DtmfConfig {
 
     private Builder() {}
 
-    /** Message bytes per token, without check bytes: at least 1 (default 5). */
+    /**
+     * Message bytes per token, without check bytes: 1 to 256 less the check bytes, and few enough
+     * that a token lasts at most 30 s on air (default 5).
+     */
     public Builder messageBytes(int value) {
       messageBytes = value;
       return this;
@@ -189,7 +207,10 @@ public final class DtmfConfig {
       return this;
     }
 
-    /** Sample rate of the modulation and of the encoded audio, Hz, positive (default 44100). */
+    /**
+     * Sample rate of the modulation and of the encoded audio, Hz, in (0, 384000] and above twice
+     * the highest tone (default 44100; the default tone set reaches 2489 Hz).
+     */
     public Builder sampleRate(float hertz) {
       sampleRate = hertz;
       return this;
@@ -239,24 +260,40 @@ public final class DtmfConfig {
      * @throws IllegalArgumentException naming the first value outside its range
      */
     public DtmfConfig build() {
-      require(messageBytes >= 1, "messageBytes must be at least 1");
-      require(sampleRate > 0, "sampleRate must be positive");
+      // DtmfWaveformConfigError (dtmf_waveform_config.cc), in its order, which both the encoder's
+      // and the decoder's checks apply.
+      int maxMessageBytes = Limits.MAX_TOKEN_BYTES - crcCheckBytes;
+      require(messageBytes >= 1 && messageBytes <= maxMessageBytes,
+          "messageBytes must be 1 to " + maxMessageBytes + (crcCheckBytes > 0 ? " with CRC" : "")
+              + ", not " + messageBytes);
+      require(sampleRate > 0 && sampleRate <= Limits.MAX_SAMPLE_RATE_HZ,
+          "sampleRate must lie in (0, " + (int) Limits.MAX_SAMPLE_RATE_HZ + "] Hz, not "
+              + sampleRate);
       require(basebandDecimationFactor >= 1, "basebandDecimationFactor must be positive");
       require(windowSeconds > 0, "windowSeconds must be positive");
-      require(Math.round(windowSeconds * sampleRate / basebandDecimationFactor) >= 1,
-          "the window must span at least one decimated sample");
+      require(frameSize(windowSeconds, sampleRate, basebandDecimationFactor) >= 1,
+          "the window must round to between one decimated sample and 2^31 samples");
       require(tonesPerSymbol >= 1, "tonesPerSymbol must be at least 1");
-      int tones = toneFrequencies.length == 0 ? 10 : toneFrequencies.length;
-      require(toneFrequencies.length > 0 || tonesPerSymbol == 2,
+      boolean defaultTones = toneFrequencies.length == 0;
+      require(!defaultTones || tonesPerSymbol == Limits.DEFAULT_DTMF_TONES_PER_SYMBOL,
           "the default tone set makes symbols of 2 tones");
-      for (float f : toneFrequencies) {
-        require(f >= 0 && f < sampleRate / 2, "every tone must lie in [0, sampleRate / 2)");
+      float[] tones = defaultTones ? Limits.DEFAULT_DTMF_TONES : toneFrequencies;
+      require(tones.length <= Limits.MAX_DTMF_TONES,
+          "a tone set may have at most " + Limits.MAX_DTMF_TONES + " tones, not " + tones.length);
+      for (float f : tones) {
+        if (!(f >= 0 && f < sampleRate / 2)) {
+          throw new IllegalArgumentException(defaultTones
+                  ? "the default tone set reaches " + Limits.MAX_DEFAULT_DTMF_TONE
+                      + " Hz: the sampleRate must be above twice that, not " + sampleRate + " Hz"
+                  : "every tone must lie in [0, sampleRate / 2): not " + f + " Hz at " + sampleRate
+                      + " Hz");
+        }
       }
-      long pairs = (long) tones * (tones - 1) / 2;
-      long symbols = combinations(tones, tonesPerSymbol, pairs + 1);
-      require(symbols >= 3, "the tones must make at least 3 symbols");
+      long symbols = symbolCount(tones.length, tonesPerSymbol);
+      long pairs = (long) tones.length * (tones.length - 1) / 2;
+      require(symbols >= Limits.MIN_DTMF_SYMBOLS, "the tones must make at least 3 symbols");
       require(symbols <= pairs, "there may be no more symbols than pairs of tones");
-      require(symbols <= (1 << 30) / 256 + 1, "too many symbols");
+      require(symbols <= Limits.MAX_DTMF_SYMBOLS, "too many symbols");
       float[] times = {envelope.attackSeconds, envelope.decaySeconds, envelope.sustainSeconds,
           envelope.releaseSeconds};
       for (float time : times) {
@@ -266,25 +303,65 @@ public final class DtmfConfig {
       require(envelope.sustainLevel >= 0 && envelope.sustainLevel <= 1,
           "the sustain level must lie in [0, 1]");
       float total = times[0] + times[1] + times[2] + times[3];
-      require(total <= windowSeconds * (1 + 4 * Math.ulp(1f)),
+      require(total <= windowSeconds * Limits.ENVELOPE_TOLERANCE,
           "the envelope times add up to more than the window");
+      // As DtmfTokenSeconds (dtmf_waveform_config.cc) computes it.
+      double tokenSeconds =
+          (double) framesPerToken(symbols, messageBytes + crcCheckBytes, checksumSymbol)
+          * frameSize(windowSeconds, sampleRate, basebandDecimationFactor) / sampleRate;
+      require(tokenSeconds <= Limits.MAX_TOKEN_SECONDS,
+          "a token may last at most " + (int) Limits.MAX_TOKEN_SECONDS + " s on air, not "
+              + tokenSeconds + " s");
       return new DtmfConfig(this);
     }
+  }
 
-    // n choose k, or `cap` once it would exceed it.
-    private static long combinations(int n, int k, long cap) {
-      if (k > n) {
-        return 0;
-      }
-      long result = 1;
-      for (int i = 1; i <= k; i++) {
-        result = result * (n - k + i) / i;
-        if (result >= cap) {
-          return cap;
-        }
-      }
-      return result;
+  // Samples per symbol as GetFrameSize (dtmf_encoder_params.cc) computes them: the window in
+  // decimated samples, rounded half away from zero in float, times the decimation; 0 beyond
+  // 2^31 - 1.
+  private static int frameSize(float windowSeconds, float sampleRate, int decimation) {
+    float decimated = windowSeconds * sampleRate / decimation;
+    // Floats from 2^23 up are whole already; below, Math.round is exact and cannot saturate.
+    double rounded = Math.abs(decimated) >= (1 << 23) ? decimated : Math.round(decimated);
+    double frame = rounded * decimation;
+    return Math.abs(frame) <= Integer.MAX_VALUE ? (int) frame : 0;
+  }
+
+  // Symbols (tone combinations) of `tones` tones taken `perSymbol` at a time, or one more than
+  // min(pairs of tones, Limits.MAX_DTMF_SYMBOLS) when there are more: CountCombinationsUpTo as
+  // DtmfWaveformConfigError calls it (dtmf_waveform_config.cc).
+  private static long symbolCount(long tones, long perSymbol) {
+    long limit = Math.min(tones * (tones - 1) / 2, Limits.MAX_DTMF_SYMBOLS);
+    if (perSymbol > tones) {
+      return 0;
     }
+    long k = Math.min(perSymbol, tones - perSymbol);
+    long count = 1;
+    for (long i = 1; i <= k; i++) {
+      count = count * (tones - k + i) / i; // Exact: a binomial coefficient at every step.
+      if (count > limit) {
+        return limit + 1;
+      }
+    }
+    return count;
+  }
+
+  // Digits of base `symbols - 1` (the spacer is no digit) that carry any `tokenBytes` bytes: the
+  // length of the largest token, 256^tokenBytes - 1, written in that base (ByteSymbolConverter,
+  // byte_symbol_converter.cc).
+  private static int digitsPerToken(long symbols, int tokenBytes) {
+    BigInteger values = BigInteger.ONE.shiftLeft(8 * tokenBytes);
+    BigInteger base = BigInteger.valueOf(symbols - 1);
+    int digits = 0;
+    for (BigInteger reach = BigInteger.ONE; reach.compareTo(values) < 0;
+         reach = reach.multiply(base)) {
+      digits++;
+    }
+    return digits;
+  }
+
+  private static int framesPerToken(long symbols, int tokenBytes, boolean checksumSymbol) {
+    return digitsPerToken(symbols, tokenBytes) + 1 + (checksumSymbol ? 1 : 0);
   }
 
   @Override

@@ -38,12 +38,20 @@ public final class EncodedToken {
   /**
    * What to hand to the loudspeaker: the start transition, then the token {@code repetitions}
    * times. Receivers decode more reliably from several repetitions.
+   *
+   * @throws IllegalArgumentException if {@code repetitions} is below 1 or makes more than an array
+   *     holds
    */
   public byte[] playback(int repetitions) {
     if (repetitions < 1) {
       throw new IllegalArgumentException("repetitions must be at least 1");
     }
-    ByteBuffer out = ByteBuffer.allocate(startTransition.length + repetitions * tokenAudio.length);
+    long bytes = startTransition.length + (long) repetitions * tokenAudio.length;
+    if (bytes > Integer.MAX_VALUE - 8) {
+      throw new IllegalArgumentException(
+          repetitions + " repetitions make " + bytes + " bytes, more than an array holds");
+    }
+    ByteBuffer out = ByteBuffer.allocate((int) bytes);
     out.put(startTransition);
     for (int i = 0; i < repetitions; i++) {
       out.put(tokenAudio);

@@ -1,0 +1,44 @@
+// Short vectors in one register where the target has one (SSE on x86, NEON
+// on ARM); GCC and Clang lower the vector extension to scalar code elsewhere.
+//
+// For loops that the auto-vectoriser leaves scalar at -O2 (reductions, whose
+// reordering needs -ffast-math, loops whose lanes are not the innermost
+// index, or trip counts known only at run time): each lane computes exactly
+// what the scalar code would, in the same order, so a four-lane loop over
+// four independent outputs is bit-identical to four scalar loops. Loads and
+// stores go through memcpy: no alignment is assumed.
+
+#ifndef AUDIO_DSP_SIMD_H_
+#define AUDIO_DSP_SIMD_H_
+
+#include <cstring>
+
+namespace audio_dsp {
+
+typedef float Float4 __attribute__((vector_size(16)));
+typedef double Double2 __attribute__((vector_size(16)));
+
+// p[0 .. 3].
+inline Float4 Load4(const float* p) {
+  Float4 v;
+  std::memcpy(&v, p, sizeof(v));
+  return v;
+}
+
+// p[0 .. 3] = v.
+inline void Store4(float* p, Float4 v) { std::memcpy(p, &v, sizeof(v)); }
+
+// Lanes 0, 1 and lanes 2, 3 of v, widened to double (exactly). (No eight-byte
+// vector types here: the 32-bit build handles those badly.)
+inline Double2 LowToDouble(Float4 v) { return Double2{v[0], v[1]}; }
+inline Double2 HighToDouble(Float4 v) { return Double2{v[2], v[3]}; }
+
+// (low[0], low[1], high[0], high[1]), each rounded to float.
+inline Float4 ToFloat4(Double2 low, Double2 high) {
+  return Float4{static_cast<float>(low[0]), static_cast<float>(low[1]), static_cast<float>(high[0]),
+                static_cast<float>(high[1])};
+}
+
+}  // namespace audio_dsp
+
+#endif  // AUDIO_DSP_SIMD_H_

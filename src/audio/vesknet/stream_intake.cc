@@ -1,0 +1,20 @@
+#include "audio/vesknet/stream_intake.h"
+
+#include "base/logging.h"
+
+namespace audio_vesknet {
+
+void DownmixChannels(const float* interleaved, int num_frames, int num_channels, float gain,
+                     std::vector<float>* mono) {
+  CHECK(mono);
+  mono->resize(num_frames);
+  float* out = mono->data();
+  for (int i = 0; i < num_frames; ++i) {
+    float sum = 0.0f;
+    for (int c = 0; c < num_channels; ++c) sum += interleaved[c];
+    out[i] = sum * gain;
+    interleaved += num_channels;
+  }
+}
+
+}  // namespace audio_vesknet
