@@ -19,10 +19,11 @@
 // the plain one and the listening mode, and counts twice in N; D counts the
 // (token, decoder) pairs in which the decoder reported the token. A false
 // token is a report of a message that was not sent to that decoder in the
-// last kMatchSeconds. The heap is glibc's in use (mallinfo2: arena and
-// mmapped blocks), taken between segments, when no temporary buffer is
-// alive: at the start after warming up (the first simulated minute), and at
-// the end.
+// last kMatchSeconds; each is printed with the last tokens sent to that
+// decoder and the number of bytes in which it differs from each. The heap
+// is glibc's in use (mallinfo2: arena and mmapped blocks), taken between
+// segments, when no temporary buffer is alive: at the start after warming
+// up (the first simulated minute), and at the end.
 
 #include <malloc.h>
 #include <sys/resource.h>
@@ -80,6 +81,8 @@ constexpr double kMaxQuietDb = -80.0;
 constexpr double kMinGainDb = -20.0;
 constexpr double kMaxGainDb = 0.0;
 constexpr double kWarmUpSeconds = 60.0;
+// Tokens per decoder that a false token is compared with.
+constexpr size_t kLastSent = 3;
 
 // Upper edges of the SNR bands of the table, dB: 1 dB where the decoders go
 // from failure to success (see the README's robustness tables).
@@ -165,6 +168,12 @@ std::vector<int16_t> MakeBackground(const Background& background, int64_t frames
   return pcm;
 }
 
+int BytesDiffering(const std::vector<uint8_t>& a, const std::vector<uint8_t>& b) {
+  int differ = static_cast<int>(std::max(a.size(), b.size()) - std::min(a.size(), b.size()));
+  for (size_t i = 0; i < std::min(a.size(), b.size()); ++i) differ += a[i] != b[i];
+  return differ;
+}
+
 int BandOf(double snr_db) {
   const double* upper = std::upper_bound(std::begin(kBandEdges) + 1, std::end(kBandEdges), snr_db);
   return std::min<int>(static_cast<int>(upper - kBandEdges) - 1, kNumBands - 1);
@@ -179,8 +188,9 @@ struct Tally {
 struct Receiver {
   struct Sent {
     std::vector<uint8_t> message;
-    double end_s;  // Stream time of the transmission's end.
-    int band;
+    double start_s;  // Stream time of the transmission's start.
+    double end_s;    // And of its end.
+    double snr_db;
     bool decoded;
   };
 
@@ -188,6 +198,7 @@ struct Receiver {
   std::unique_ptr<audio_modem::AudioModemDecoder> decoder;
   std::unique_ptr<vesk_tool::StreamDecoder> stream;
   std::vector<Sent> pending;  // Sent in the last kMatchSeconds.
+  std::vector<Sent> last;     // The last kLastSent sent, to explain a false token.
   std::array<Tally, kNumBands> bands{};
   int sent = 0;
   int decoded = 0;
@@ -366,9 +377,13 @@ void Soak::Transmit() {
   air.channel.seed = seed;
   const vesk_channel::ChannelOutput heard =
       vesk_tool::PlayOverTheAir(*transmitter.encoder, message, transmitter.crc_bytes, air);
-  const double end_s = now_s() + static_cast<double>(heard.samples.size()) / kMicRate;
+  const Receiver::Sent sent{message, now_s(),
+                            now_s() + static_cast<double>(heard.samples.size()) / kMicRate, snr_db,
+                            false};
   for (Receiver* receiver : transmitter.receivers) {
-    receiver->pending.push_back({message, end_s, BandOf(snr_db), false});
+    receiver->pending.push_back(sent);
+    if (receiver->last.size() == kLastSent) receiver->last.erase(receiver->last.begin());
+    receiver->last.push_back(sent);
     ++receiver->sent;
     ++receiver->bands[BandOf(snr_db)].sent;
   }
@@ -402,13 +417,19 @@ void Soak::Judge(Receiver* receiver, const vesk_tool::FoundToken& token) {
     } else {
       sent.decoded = true;
       ++receiver->decoded;
-      ++receiver->bands[sent.band].decoded;
+      ++receiver->bands[BandOf(sent.snr_db)].decoded;
     }
     return;
   }
   ++receiver->false_tokens;
-  std::printf("false token: %s reported %s at %s, hearing %s\n", receiver->name,
-              vesk_tool::ToHex(token.bytes).c_str(), Clock(token.time_s).c_str(), playing_.c_str());
+  std::printf("false token: %s reported %s at %s, while playing %s; last sent to it:\n",
+              receiver->name, vesk_tool::ToHex(token.bytes).c_str(), Clock(token.time_s).c_str(),
+              playing_.c_str());
+  for (const Receiver::Sent& sent : receiver->last) {
+    std::printf("  %s at %s to %s, %.1f dB SNR, %d bytes differ\n",
+                vesk_tool::ToHex(sent.message).c_str(), Clock(sent.start_s).c_str(),
+                Clock(sent.end_s).c_str(), sent.snr_db, BytesDiffering(sent.message, token.bytes));
+  }
   std::fflush(stdout);
 }
 

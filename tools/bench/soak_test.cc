@@ -47,11 +47,55 @@ Result RunSoak(std::vector<std::string> args) {
   return result;
 }
 
-// Tokens sent to `decoder`, from the per-decoder table.
-int SentTo(const Result& result, const std::string& decoder) {
+const char* const kDecoders[] = {"DSSS 48k", "DSSS 44.1k", "DTMF", "listening"};
+
+// A decoder's row of the per-decoder table: sent, decoded, reported again,
+// false; all -1 when it is missing.
+std::vector<int> RowOf(const Result& result, const std::string& decoder) {
   std::smatch m;
-  const std::regex row("\\| " + decoder + " \\| ([0-9]+) \\|");
-  return std::regex_search(result.out, m, row) ? std::stoi(m[1]) : -1;
+  const std::regex row("\\| " + decoder +
+                       " \\| ([0-9]+) \\| ([0-9]+) \\| ([0-9]+) \\| ([0-9]+) \\|");
+  if (!std::regex_search(result.out, m, row)) return {-1, -1, -1, -1};
+  return {std::stoi(m[1]), std::stoi(m[2]), std::stoi(m[3]), std::stoi(m[4])};
+}
+
+int SentTo(const Result& result, const std::string& decoder) { return RowOf(result, decoder)[0]; }
+
+// The totals of the RESULT line are the sums of the per-decoder table, and
+// the SNR band table adds up to each decoder's sent and decoded counts.
+void ExpectTablesAddUp(const Result& result) {
+  int sent = 0, decoded = 0, false_tokens = 0;
+  for (const char* decoder : kDecoders) {
+    const std::vector<int> row = RowOf(result, decoder);
+    ASSERT_GE(row[0], 0) << decoder << " has no row in:\n" << result.out;
+    sent += row[0];
+    decoded += row[1];
+    false_tokens += row[3];
+  }
+  EXPECT_EQ(sent, result.sent);
+  EXPECT_EQ(decoded, result.decoded);
+  EXPECT_EQ(false_tokens, result.false_tokens);
+  // Band rows: "| low to high |" then per decoder "- |" or "d/s (p%) |".
+  int band_sent[4] = {}, band_decoded[4] = {};
+  const std::regex band_row("\\| -?[0-9]+ to -?[0-9]+ \\|(.*)\n");
+  const std::regex cell(" (?:-|([0-9]+)/([0-9]+) \\([0-9]+%\\)) \\|");
+  for (std::sregex_iterator row(result.out.begin(), result.out.end(), band_row), end; row != end;
+       ++row) {
+    const std::string cells = (*row)[1];
+    int column = 0;
+    for (std::sregex_iterator c(cells.begin(), cells.end(), cell); c != end; ++c, ++column) {
+      ASSERT_LT(column, 4) << (*row)[0];
+      if ((*c)[1].matched) {
+        band_decoded[column] += std::stoi((*c)[1]);
+        band_sent[column] += std::stoi((*c)[2]);
+      }
+    }
+    EXPECT_EQ(column, 4) << (*row)[0];
+  }
+  for (int i = 0; i < 4; ++i) {
+    EXPECT_EQ(band_sent[i], RowOf(result, kDecoders[i])[0]) << kDecoders[i];
+    EXPECT_EQ(band_decoded[i], RowOf(result, kDecoders[i])[1]) << kDecoders[i];
+  }
 }
 
 void ExpectFlatMemory(const Result& result) {
@@ -77,6 +121,7 @@ TEST(SoakTest, LoudTokensAreAllDecodedAndNoneIsFalse) {
   EXPECT_GT(dtmf, 0);
   EXPECT_EQ(SentTo(result, "listening"), dsss48);
   EXPECT_EQ(result.sent, 2 * dsss48 + dsss44 + dtmf);
+  ExpectTablesAddUp(result);
 }
 
 // Over the whole SNR range some tokens are lost, none is false, and the same
@@ -87,6 +132,7 @@ TEST(SoakTest, AnySnrNoFalseTokenAndRepeatable) {
   EXPECT_GT(result.sent, 0);
   EXPECT_LE(result.decoded, result.sent);
   EXPECT_EQ(result.false_tokens, 0);
+  ExpectTablesAddUp(result);
   const Result again = RunSoak({"--seed", "4"});
   EXPECT_EQ(again.sent, result.sent);
   EXPECT_EQ(again.decoded, result.decoded);
@@ -99,6 +145,14 @@ TEST(SoakTest, HostileSoundReportsNothing) {
   EXPECT_EQ(result.decoded, 0);
   EXPECT_EQ(result.false_tokens, 0);
   ExpectFlatMemory(result);
+}
+
+TEST(SoakTest, RefusesAnEmptySnrRange) {
+  const vesk_tool::ProcessResult run =
+      vesk_tool::RunProcess(SOAK, {"--min-snr", "5", "--max-snr", "4"});
+  EXPECT_EQ(run.exit_status, 2);
+  EXPECT_NE(run.err.find("--min-snr must not exceed --max-snr"), std::string::npos) << run.err;
+  EXPECT_EQ(run.out.find("RESULT"), std::string::npos);
 }
 
 }  // namespace
