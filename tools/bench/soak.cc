@@ -8,7 +8,12 @@
 // was sent to that decoder; the heap and the resident set are watched.
 //
 //   soak [--hours H] [--seed N] [--min-snr DB] [--max-snr DB] [--hostile]
+//        [--record FILE --record-from S --record-seconds S]
 //
+// --record writes the microphone stream from stream time --record-from on,
+// for --record-seconds, as headerless 16-bit little-endian PCM (48 kHz
+// mono), so that a false token can be decoded again alone, e.g. with
+// `vesk decode --raw --rate 48000 --channels 1`.
 // --hostile sends no token and adds music (chords of harmonic tones) to the
 // background sounds: every reported token is false.
 //
@@ -95,6 +100,9 @@ struct Options {
   double min_snr_db = -20.0;
   double max_snr_db = 20.0;
   bool hostile = false;
+  std::string record_path;  // Empty: no recording.
+  double record_from_s = 0.0;
+  double record_seconds = 60.0;
 };
 
 enum class Sound { kNoise, kBabble, kMusic, kZero, kQuietNoise };
@@ -238,6 +246,8 @@ std::string Clock(double seconds) {
 class Soak {
  public:
   explicit Soak(const Options& options);
+  // False when the recording file cannot be opened.
+  bool recording_ok() const;
   void Run();
   void Report() const;
 
@@ -249,6 +259,9 @@ class Soak {
   // Feeds `pcm` to every decoder, a chunk at a time, and judges what they report.
   void Feed(const std::vector<int16_t>& pcm);
   void Judge(Receiver* receiver, const vesk_tool::FoundToken& token);
+  // Writes the part of `count` samples starting at stream frame frames_ that
+  // falls in the recorded span.
+  void Record(const int16_t* samples, int64_t count);
   // Between segments: expiry of old tokens, the heap and progress.
   void Checkpoint();
   double now_s() const { return static_cast<double>(frames_) / kMicRate; }
@@ -268,6 +281,7 @@ class Soak {
   long heap_high_kib_ = -1;
   double next_progress_s_ = 3600.0;
   std::chrono::steady_clock::time_point started_;
+  std::unique_ptr<FILE, int (*)(FILE*)> record_{nullptr, fclose};
 };
 
 Soak::Soak(const Options& options)
@@ -276,7 +290,10 @@ Soak::Soak(const Options& options)
       plan_(vesk_channel::DeriveSeed(static_cast<uint64_t>(options.seed), 0)) {
   AddReceivers();
   AddTransmitters();
+  if (!options.record_path.empty()) record_.reset(std::fopen(options.record_path.c_str(), "wb"));
 }
+
+bool Soak::recording_ok() const { return options_.record_path.empty() || record_ != nullptr; }
 
 void Soak::AddReceivers() {
   audio_modem::DsssDecoderConfig dsss;
@@ -405,7 +422,18 @@ void Soak::Feed(const std::vector<int16_t>& pcm) {
       r.wake_ups += r.was_listening && !listening;
       r.was_listening = listening;
     }
+    if (record_) Record(pcm.data() + start, count);
     frames_ += count;
+  }
+}
+
+void Soak::Record(const int16_t* samples, int64_t count) {
+  const int64_t from = std::llround(options_.record_from_s * kMicRate);
+  const int64_t to = from + std::llround(options_.record_seconds * kMicRate);
+  const int64_t first = std::max(from, frames_), last = std::min(to, frames_ + count);
+  if (first < last) {
+    std::fwrite(samples + (first - frames_), sizeof(int16_t), static_cast<size_t>(last - first),
+                record_.get());
   }
 }
 
@@ -524,6 +552,13 @@ int ParseOptions(int argc, char** argv, Options* options) {
       .Placeholder("DB");
   parser.AddFlag("hostile", &options->hostile,
                  "no tokens; noise, babble, music and silence at any level");
+  parser
+      .AddString("record", &options->record_path,
+                 "write the microphone stream as headerless 16-bit PCM to this file")
+      .Placeholder("FILE");
+  parser.AddDouble("record-from", &options->record_from_s, "stream time where recording starts, s")
+      .Range(0, 3.6e6);
+  parser.AddDouble("record-seconds", &options->record_seconds, "seconds to record").Range(0, 3.6e6);
   std::string error;
   if (parser.Parse(std::vector<std::string>(argv + 1, argv + argc), &error) &&
       parser.help_requested()) {
@@ -554,6 +589,10 @@ int main(int argc, char** argv) {
   const int status = vesk_bench::ParseOptions(argc, argv, &options);
   if (status >= 0) return status;
   vesk_bench::Soak soak(options);
+  if (!soak.recording_ok()) {
+    std::fprintf(stderr, "%s: cannot write %s\n", argv[0], options.record_path.c_str());
+    return 1;
+  }
   soak.Run();
   soak.Report();
   return 0;
