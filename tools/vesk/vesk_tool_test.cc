@@ -7,6 +7,7 @@
 
 #include <cmath>
 #include <cstdlib>
+#include <filesystem>
 #include <map>
 #include <string>
 #include <vector>
@@ -28,11 +29,33 @@ ProcessResult Vesk(const std::vector<std::string>& args, const std::string& inpu
   return RunProcess(VESK_BINARY, args, options);
 }
 
-// A file of this test alone (ctest runs tests in parallel processes).
+// A directory of this test process alone (ctest runs tests in parallel
+// processes), made before the first test and removed with its files after
+// the last.
+class TempDirectory : public ::testing::Environment {
+ public:
+  void SetUp() override {
+    std::string pattern = ::testing::TempDir() + "/vesk_tool_test_XXXXXX";
+    ASSERT_NE(mkdtemp(pattern.data()), nullptr) << pattern;
+    path_ = pattern;
+  }
+  void TearDown() override {
+    std::error_code ignored;
+    std::filesystem::remove_all(path_, ignored);
+  }
+  const std::string& path() const { return path_; }
+
+ private:
+  std::string path_;
+};
+
+TempDirectory* const temp_directory =
+    static_cast<TempDirectory*>(::testing::AddGlobalTestEnvironment(new TempDirectory));
+
+// A file of this test alone.
 std::string TempPath(const std::string& name) {
-  return ::testing::TempDir() + "/" +
-         ::testing::UnitTest::GetInstance()->current_test_info()->name() + "_" +
-         std::to_string(getpid()) + "_" + name;
+  return temp_directory->path() + "/" +
+         ::testing::UnitTest::GetInstance()->current_test_info()->name() + "_" + name;
 }
 
 // Interleaved float samples of a sound file, unscaled, with its rate and

@@ -25,18 +25,41 @@ class GammaFilter {
       : sample_rate_(sample_rate), order_(order), decay_(decay), gain_(1.0 - decay) {
     CHECK(sample_rate > 0.0);
     CHECK(order >= 1);
-    state_.assign(order, 0.0);
+    state_.assign(order, 0.0f);
   }
 
-  // Feeds one sample and returns the output of the last stage. The stages
-  // run in double precision: no rounding inside the recursion.
+  // Feeds one sample and returns the output of the last stage. Each stage is
+  // computed in double precision and stored as float, and the next stage
+  // reads the stored value: (in - state) x gain + state, rounded to float.
   float Step(float x) {
-    double in = x;
-    for (double& stage : state_) {
-      stage += (in - stage) * gain_;
+    float in = x;
+    for (float& stage : state_) {
+      stage = StageStep(in, stage, gain_);
       in = stage;
     }
-    return static_cast<float>(in);
+    return in;
+  }
+
+  // Step over input[0 .. count) in order, writing output i to output[i]
+  // unless output is null. output may be input, or lie before it (output <=
+  // input): each input is read before the output at or after it is written.
+  // Filters of up to four stages keep their state in registers meanwhile;
+  // the results equal Step's.
+  void Process(const float* input, int count, float* output) {
+    switch (order_) {
+      case 1:
+        return ProcessStages<1>(input, count, output);
+      case 2:
+        return ProcessStages<2>(input, count, output);
+      case 3:
+        return ProcessStages<3>(input, count, output);
+      case 4:
+        return ProcessStages<4>(input, count, output);
+    }
+    for (int i = 0; i < count; ++i) {
+      const float y = Step(input[i]);
+      if (output != nullptr) output[i] = y;
+    }
   }
 
   // Group delay in samples: the mean of the impulse response,
@@ -48,17 +71,39 @@ class GammaFilter {
   double sample_rate() const { return sample_rate_; }
 
   // Clears the state of every stage, as after construction.
-  void Reset() { state_.assign(state_.size(), 0.0); }
+  void Reset() { state_.assign(state_.size(), 0.0f); }
   // Sets every stage to `value`: the state after a long steady input of
   // `value`, so that a stream starting near it does not ramp up from zero.
-  void Reset(float value) { state_.assign(state_.size(), static_cast<double>(value)); }
+  void Reset(float value) { state_.assign(state_.size(), value); }
 
  private:
+  // One stage: (in - state) x gain + state in double, rounded to float.
+  static float StageStep(float in, float state, double gain) {
+    const double previous = state;
+    return static_cast<float>((static_cast<double>(in) - previous) * gain + previous);
+  }
+
+  template <int kOrder>
+  void ProcessStages(const float* input, int count, float* output) {
+    float stages[kOrder];
+    for (int k = 0; k < kOrder; ++k) stages[k] = state_[k];
+    const double gain = gain_;
+    for (int i = 0; i < count; ++i) {
+      float in = input[i];
+      for (int k = 0; k < kOrder; ++k) {
+        stages[k] = StageStep(in, stages[k], gain);
+        in = stages[k];
+      }
+      if (output != nullptr) output[i] = in;
+    }
+    for (int k = 0; k < kOrder; ++k) state_[k] = stages[k];
+  }
+
   double sample_rate_;
   int order_;
   double decay_;
   double gain_;
-  std::vector<double> state_;  // One value per stage.
+  std::vector<float> state_;  // One value per stage.
 };
 
 // A GammaFilter whose impulse response has the standard deviation `stddev`

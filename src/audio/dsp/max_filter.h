@@ -58,28 +58,21 @@ void MaxFilter(const T* input, int num_samples, int window_size, T* output,
   // to the block's end (or the input's end).
   scratch->resize(n);
   T* const suffix = scratch->data();
-  const int64_t full_blocks = n / w;
-  for (int64_t b = 0; b < full_blocks; ++b) {
-    output[b * w] = input[b * w];
-    suffix[b * w + w - 1] = input[b * w + w - 1];
-  }
-  // Each running maximum is a chain of dependent steps; stepping all blocks
-  // in lockstep, both directions at once, lets independent chains overlap.
-  for (int64_t i = 1; i < w; ++i) {
-    for (int64_t b = 0; b < full_blocks; ++b) {
-      const int64_t start = b * w;
-      const int64_t last = start + w - 1;
-      output[start + i] = max(input[start + i], output[start + i - 1]);
-      suffix[last - i] = max(input[last - i], suffix[last - i + 1]);
-    }
-  }
-  const int64_t start = full_blocks * w;  // The partial block at the end, if any.
-  if (start < n) {
-    output[start] = input[start];
-    suffix[n - 1] = input[n - 1];
-    for (int64_t i = 1; i < n - start; ++i) {
-      output[start + i] = max(input[start + i], output[start + i - 1]);
-      suffix[n - 1 - i] = max(input[n - 1 - i], suffix[n - i]);
+  // Block by block, both directions at once: two independent chains of
+  // steps, each carried in a register (through memory, each step would wait
+  // for the store of the one before).
+  for (int64_t start = 0; start < n; start += w) {
+    const int64_t length = std::min<int64_t>(w, n - start);
+    const int64_t last = start + length - 1;
+    T forward = input[start];
+    T backward = input[last];
+    output[start] = forward;
+    suffix[last] = backward;
+    for (int64_t i = 1; i < length; ++i) {
+      forward = max(input[start + i], forward);
+      backward = max(input[last - i], backward);
+      output[start + i] = forward;
+      suffix[last - i] = backward;
     }
   }
 

@@ -87,6 +87,10 @@ TEST(CombinationIteratorTest, LexicographicOrderAndDegenerateSizes) {
             std::vector<std::string>({"Next() called when already done."}));
 }
 
+TEST(CombinationIteratorDeathTest, NegativeSizeIsRefused) {
+  EXPECT_DEATH(CombinationIterator(3, -1), "Check failed: k >= 0");
+}
+
 TEST(MixedRadixCounterTest, VisitsDigitVectorsAndCompares) {
   Vectors visited;
   MixedRadixCounter counter({2, 3});

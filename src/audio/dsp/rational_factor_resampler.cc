@@ -73,11 +73,88 @@ inline std::complex<float> Dot(const float* doubled_taps, const std::complex<flo
   return {re, im};
 }
 
-// Floats stored per tap: complex samples use duplicated taps.
+// PartialSums of `kCount` products at once, sums[j] = PartialSums(a[j], b[j],
+// n): the same steps, lane for lane, with the loop shared.
+template <int kCount>
+inline void PartialSumsOfGroup(const float* const* a, const float* const* b, int n, Float4* sums) {
+  Float4 acc0[kCount], acc1[kCount];
+#pragma GCC unroll 4
+  for (int j = 0; j < kCount; ++j) acc0[j] = acc1[j] = Float4{0.0f, 0.0f, 0.0f, 0.0f};
+  int m = 0;
+  for (; m + 8 <= n; m += 8) {
+#pragma GCC unroll 4
+    for (int j = 0; j < kCount; ++j) {
+      acc0[j] += Load4(a[j] + m) * Load4(b[j] + m);
+      acc1[j] += Load4(a[j] + m + 4) * Load4(b[j] + m + 4);
+    }
+  }
+  if (m + 4 <= n) {
+#pragma GCC unroll 4
+    for (int j = 0; j < kCount; ++j) acc1[j] += Load4(a[j] + m) * Load4(b[j] + m);
+  }
+#pragma GCC unroll 4
+  for (int j = 0; j < kCount; ++j) sums[j] = acc0[j] + acc1[j];
+}
+
+// Four real outputs at once, out[j] = Dot(taps[j], x[j], num_taps) exactly:
+// the partial sums of the four are transposed so that one vector step does
+// their four horizontal sums, each in Dot's order.
+inline void DotGroup(const float* const* taps, const float* const* x, int num_taps, float* out) {
+  Float4 lanes[4];
+  PartialSumsOfGroup<4>(taps, x, num_taps, lanes);
+  Transpose4(lanes);  // lanes[l]: lane l of each output's partial sums.
+  const int tail = num_taps & ~3;
+  Float4 rest = {0.0f, 0.0f, 0.0f, 0.0f};
+  switch (num_taps - tail) {
+    case 3:
+#pragma GCC unroll 4
+      for (int j = 0; j < 4; ++j) {
+        const float* t = taps[j] + tail;
+        const float* y = x[j] + tail;
+        rest[j] = t[0] * y[0] + (t[1] * y[1] + t[2] * y[2]);
+      }
+      break;
+    case 2:
+#pragma GCC unroll 4
+      for (int j = 0; j < 4; ++j) {
+        rest[j] = taps[j][tail] * x[j][tail] + taps[j][tail + 1] * x[j][tail + 1];
+      }
+      break;
+    case 1:
+#pragma GCC unroll 4
+      for (int j = 0; j < 4; ++j) rest[j] = taps[j][tail] * x[j][tail];
+      break;
+  }
+  Store4(out, ((lanes[0] + lanes[2]) + (lanes[1] + lanes[3])) + rest);
+}
+
+// Two complex outputs at once, exactly as Dot computes each.
+inline void DotGroup(const float* const* doubled_taps, const std::complex<float>* const* x,
+                     int num_taps, std::complex<float>* out) {
+  const int n = 2 * num_taps;
+  const float* xf[2] = {reinterpret_cast<const float*>(x[0]), reinterpret_cast<const float*>(x[1])};
+  Float4 sums[2];
+  PartialSumsOfGroup<2>(doubled_taps, xf, n, sums);
+  // (re, im) of both: lanes 0 + 2 and 1 + 3 of each.
+  Float4 both = __builtin_shufflevector(sums[0], sums[1], 0, 1, 4, 5) +
+                __builtin_shufflevector(sums[0], sums[1], 2, 3, 6, 7);
+  if (n & 2) {
+    const float* t0 = doubled_taps[0];
+    const float* t1 = doubled_taps[1];
+    both += Float4{t0[n - 2] * xf[0][n - 2], t0[n - 1] * xf[0][n - 1], t1[n - 2] * xf[1][n - 2],
+                   t1[n - 1] * xf[1][n - 1]};
+  }
+  Store4(reinterpret_cast<float*>(out), both);
+}
+
+// Floats stored per tap: complex samples use duplicated taps. Outputs
+// computed side by side: as many as fill a vector.
 template <typename T>
 constexpr int kFloatsPerTap = 1;
 template <>
 constexpr int kFloatsPerTap<std::complex<float>> = 2;
+template <typename T>
+constexpr int kGroupSize = 4 / kFloatsPerTap<T>;
 
 }  // namespace
 
@@ -164,6 +241,24 @@ void RationalFactorResampler<T>::ProcessSamples(const std::vector<T>& input,
       phase -= denominator_;
       ++s;
     }
+  }
+  // The windows wholly in the input, a group at a time, then one by one.
+  constexpr int kGroup = kGroupSize<T>;
+  const float* group_taps[kGroup];
+  const T* group_input[kGroup];
+  for (; k + kGroup <= count; k += kGroup) {
+#pragma GCC unroll 4
+    for (int j = 0; j < kGroup; ++j) {
+      group_taps[j] = filters + phase * filter_stride;
+      group_input[j] = input.data() + (s - num_buffered);
+      s += step_;
+      phase += phase_increment_;
+      if (phase >= denominator_) {
+        phase -= denominator_;
+        ++s;
+      }
+    }
+    DotGroup(group_taps, group_input, num_taps, out + k);
   }
   for (; k < count; ++k) {
     out[k] = Dot(filters + phase * filter_stride, input.data() + (s - num_buffered), num_taps);

@@ -39,6 +39,24 @@ inline Float4 ToFloat4(Double2 low, Double2 high) {
                 static_cast<float>(high[1])};
 }
 
+// Lane-wise std::max(a, b) and std::min(a, b): the same comparisons, so the
+// same results, NaN included.
+inline Float4 Max4(Float4 a, Float4 b) { return a < b ? b : a; }
+inline Float4 Min4(Float4 a, Float4 b) { return b < a ? b : a; }
+
+// Transposes the 4 x 4 matrix whose rows are r[0 .. 3]: afterwards lane j of
+// r[i] holds what lane i of r[j] held.
+inline void Transpose4(Float4* r) {
+  const Float4 t0 = __builtin_shufflevector(r[0], r[1], 0, 4, 1, 5);
+  const Float4 t1 = __builtin_shufflevector(r[0], r[1], 2, 6, 3, 7);
+  const Float4 t2 = __builtin_shufflevector(r[2], r[3], 0, 4, 1, 5);
+  const Float4 t3 = __builtin_shufflevector(r[2], r[3], 2, 6, 3, 7);
+  r[0] = __builtin_shufflevector(t0, t2, 0, 1, 4, 5);
+  r[1] = __builtin_shufflevector(t0, t2, 2, 3, 6, 7);
+  r[2] = __builtin_shufflevector(t1, t3, 0, 1, 4, 5);
+  r[3] = __builtin_shufflevector(t1, t3, 2, 3, 6, 7);
+}
+
 }  // namespace audio_dsp
 
 #endif  // AUDIO_DSP_SIMD_H_

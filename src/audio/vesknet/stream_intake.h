@@ -59,10 +59,17 @@ int64_t AdmitBlock(int64_t num_values, int num_channels, int64_t good_block_marg
   return first;
 }
 
-// mono[i] = (interleaved[i * num_channels] + ... + the frame's last channel)
-// x gain: the channels summed in order in single precision, then scaled
-// (gain 1 keeps the plain sum exactly). `mono` is resized to num_frames.
-void DownmixChannels(const float* interleaved, int num_frames, int num_channels, float gain,
+// How the channels of a frame become one sample.
+enum class Downmix {
+  kSum,   // Their plain sum (the DSSS decoder).
+  kMean,  // Their sum divided by the channel count (the DTMF decoder).
+};
+
+// mono[i] = interleaved[i * num_channels] + ... + the frame's last channel,
+// summed in order in single precision; with Downmix::kMean then divided by
+// (float) num_channels (a division, not a product with its reciprocal, which
+// differs in the last bit for 3 channels). `mono` is resized to num_frames.
+void DownmixChannels(const float* interleaved, int num_frames, int num_channels, Downmix downmix,
                      std::vector<float>* mono);
 
 }  // namespace audio_vesknet

@@ -69,15 +69,19 @@ TEST(StreamIntakeTest, NothingLeftOfABlockAfterARestart) {
   EXPECT_EQ(history.restarts, 1);
 }
 
-TEST(StreamIntakeTest, DownmixSumsTheChannelsThenScales) {
+// Sums in channel order; the mean divides the sum by the count: 7 / 3 is
+// 0x1.2aaaaap+1, where 7 x (1 / 3) would round to 0x1.2aaaacp+1.
+TEST(StreamIntakeTest, DownmixSumsOrAveragesTheChannels) {
   const std::vector<float> interleaved = {1, 2, 4, 0.1f, 0.2f, 0.3f};
   std::vector<float> mono;
-  DownmixChannels(interleaved.data(), 2, 3, 1.0f, &mono);
+  DownmixChannels(interleaved.data(), 2, 3, Downmix::kSum, &mono);
   EXPECT_EQ(mono, (std::vector<float>{7, (0.1f + 0.2f) + 0.3f}));
-  DownmixChannels(interleaved.data(), 2, 3, 1.0f / 3, &mono);
-  EXPECT_EQ(mono, (std::vector<float>{7 * (1.0f / 3), ((0.1f + 0.2f) + 0.3f) * (1.0f / 3)}));
-  DownmixChannels(interleaved.data(), 3, 2, 0.5f, &mono);
+  DownmixChannels(interleaved.data(), 2, 3, Downmix::kMean, &mono);
+  EXPECT_EQ(mono, (std::vector<float>{0x1.2aaaaap+1f, ((0.1f + 0.2f) + 0.3f) / 3}));
+  DownmixChannels(interleaved.data(), 3, 2, Downmix::kMean, &mono);
   EXPECT_EQ(mono, (std::vector<float>{1.5f, 2.05f, 0.25f}));
+  DownmixChannels(interleaved.data(), 6, 1, Downmix::kMean, &mono);
+  EXPECT_EQ(mono, interleaved);
 }
 
 }  // namespace

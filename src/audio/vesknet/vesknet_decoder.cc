@@ -115,6 +115,11 @@ int VesknetDecoder::TokenPeriodFrames() const {
 }
 
 void VesknetDecoder::Initialize(float sample_rate, int num_channels) {
+  // The downmix divides by the channel count and the buffer sizes scale with
+  // the rate: neither may be zero or negative (configuration checks in front
+  // keep callers within both).
+  CHECK(sample_rate > 0.0);
+  CHECK(num_channels >= 1);
   received_rate_ = sample_rate;
   num_channels_ = num_channels;
   input_per_baseband_ = sample_rate / baseband_rate_;
@@ -174,7 +179,7 @@ void VesknetDecoder::ProcessSamples(const std::vector<float>& received_samples) 
   if (num_channels_ > 1) {
     CHECK(received_samples.size() % num_channels_ == 0);
     mono_count /= num_channels_;
-    DownmixChannels(mono, mono_count, num_channels_, 1.0f, &mono_);
+    DownmixChannels(mono, mono_count, num_channels_, Downmix::kSum, &mono_);
     mono = mono_.data();
   }
   if (params_.save_received_samples) SaveReceivedSamples(mono, mono_count);

@@ -135,8 +135,9 @@ class VesknetDecoder {
                  const VesknetDecoderParams& params);
   ~VesknetDecoder();
 
-  // (Re)starts all streaming state for input at `sample_rate` Hz with
-  // `num_channels` interleaved channels.
+  // (Re)starts all streaming state for input at `sample_rate` Hz (> 0) with
+  // `num_channels` (>= 1) interleaved channels; other values, and a rate the
+  // baseband resampler cannot take, are fatal.
   void Initialize(float sample_rate, int num_channels);
 
   // Takes in interleaved samples in the 16-bit range. Input that would

@@ -248,7 +248,11 @@ TEST(VesknetDecoderDeathTest, ChecksItsInputs) {
   EXPECT_DEATH(decoder.ProcessSamples({1, 2, 3}),
                "Check failed: received_samples.size\\(\\) % num_channels_ == 0");
   EXPECT_DEATH(decoder.GetToken(nullptr), "Check failed: results");
-  EXPECT_DEATH(decoder.Initialize(-5, 1),
+  EXPECT_DEATH(decoder.Initialize(-5, 1), "Check failed: sample_rate > 0\\.0");
+  EXPECT_DEATH(decoder.Initialize(std::nanf(""), 1), "Check failed: sample_rate > 0\\.0");
+  EXPECT_DEATH(decoder.Initialize(44100, 0), "Check failed: num_channels >= 1");
+  // Positive, but 2^16 times the baseband rate or more: no resampler.
+  EXPECT_DEATH(decoder.Initialize(1e9f, 1),
                "Check failed: baseband_resampler_->Valid\\(\\) Failed to "
                "initialize RationalFactorResampler.");
 }

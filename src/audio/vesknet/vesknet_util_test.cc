@@ -79,6 +79,31 @@ TEST(VesknetUtilTest, ComplexLowpassResponse) {
   EXPECT_LT(gain(-0.3), 0.02);
 }
 
+// Three taps: the response's inverse transform at -1, 0 and 1, the outer two
+// weighted by the window cos(j pi / (2 half + 2)) = cos(pi / 4).
+TEST(VesknetUtilTest, ComplexLowpassTapsAreWindowedImpulse) {
+  const double cutoff = 0.1, edge = 0.3;  // Sharpness 2.5.
+  auto impulse = [&](int j) {
+    std::complex<double> sum;
+    for (int k = -511; k <= 512; ++k) {
+      const double f = k / 1024.0;
+      const double r = f < -cutoff ? 0.0
+                       : f <= edge ? 1.0
+                                   : std::cos((f - edge) * M_PI / 2 / (0.5 - edge));
+      sum += r * std::polar(1.0, 2 * M_PI * j * k / 1024);
+    }
+    return sum;
+  };
+  const std::vector<std::complex<float>> taps = MakeComplexLowpassFilter(3, 0.1f, 2.5f);
+  ASSERT_EQ(taps.size(), 3u);
+  const double w = std::cos(M_PI / 4);
+  const std::complex<double> expected[3] = {impulse(-1) * w, impulse(0), impulse(1) * w};
+  for (int j = 0; j < 3; ++j) {
+    EXPECT_LT(std::abs(std::complex<double>(taps[j]) - expected[j]), 1e-3 * std::abs(expected[j]))
+        << j;
+  }
+}
+
 TEST(VesknetUtilDeathTest, ChecksArguments) {
   std::vector<float> values;
   EXPECT_DEATH(MakeFrequencyOffsets(0.0f, 10.0f, &values), "Check failed: frequency_step > 0.0f");

@@ -25,6 +25,101 @@ constexpr int kResamplerMaxDenominator = 2000;
 // Keeps the acquisition ratio finite when the noise estimate is zero.
 constexpr float kNoiseFloor = 1e-12f;
 
+// lanes[t] = (rows[0][t], ..., rows[3][t]) for t < count.
+void RowsToLanes(const float* const* rows, int count, audio_dsp::Float4* lanes) {
+  int t = 0;
+  for (; t + 4 <= count; t += 4) {
+    audio_dsp::Float4 block[4] = {audio_dsp::Load4(rows[0] + t), audio_dsp::Load4(rows[1] + t),
+                                  audio_dsp::Load4(rows[2] + t), audio_dsp::Load4(rows[3] + t)};
+    audio_dsp::Transpose4(block);
+    for (int j = 0; j < 4; ++j) lanes[t + j] = block[j];
+  }
+  for (; t < count; ++t)
+    lanes[t] = audio_dsp::Float4{rows[0][t], rows[1][t], rows[2][t], rows[3][t]};
+}
+
+// rows[l][t] = lane l of lanes[t] for t < count, lane 3 first (rows may
+// repeat; a repeated row gets the lowest such lane).
+void LanesToRows(const audio_dsp::Float4* lanes, int count, float* const* rows) {
+  int t = 0;
+  for (; t + 4 <= count; t += 4) {
+    audio_dsp::Float4 block[4] = {lanes[t], lanes[t + 1], lanes[t + 2], lanes[t + 3]};
+    audio_dsp::Transpose4(block);
+    for (int l = 3; l >= 0; --l) audio_dsp::Store4(rows[l] + t, block[l]);
+  }
+  for (; t < count; ++t) {
+    for (int l = 3; l >= 0; --l) rows[l][t] = lanes[t][l];
+  }
+}
+
+// Vector or single float, loaded alike.
+template <typename V>
+V LoadLanes(const float* p);
+template <>
+audio_dsp::Float4 LoadLanes<audio_dsp::Float4>(const float* p) {
+  return audio_dsp::Load4(p);
+}
+template <>
+float LoadLanes<float>(const float* p) {
+  return *p;
+}
+inline float Max4(float a, float b) { return std::max(a, b); }
+inline float Min4(float a, float b) { return std::min(a, b); }
+using audio_dsp::Max4;
+using audio_dsp::Min4;
+
+// For the times t .. t + lanes of V: each row's value bubbles through the
+// top_count largest so far (largest first); what falls out of the last place
+// is one of the values below position k of the ascending order and goes to
+// the noise sum, in row order. *peak = the top_count-th largest, *noise_sum =
+// that sum. kTop is top_count when known at compile time (the ranks then
+// stay in registers), else 0 and `top` holds top_count vectors of scratch.
+template <int kTop, typename V>
+void RankTimes(const float* const* rows, int num_rows, int top_count, int t, V* top, V* peak,
+               V* noise_sum) {
+  const int ranks = kTop > 0 ? kTop : top_count;
+  for (int j = 0; j < ranks; ++j) top[j] = V{} - std::numeric_limits<float>::infinity();
+  V sum = V{};
+  for (int i = 0; i < num_rows; ++i) {
+    V moving = LoadLanes<V>(rows[i] + t);
+    for (int j = 0; j < ranks; ++j) {
+      const V larger = Max4(moving, top[j]);
+      moving = Min4(moving, top[j]);
+      top[j] = larger;
+    }
+    if (i >= ranks) sum += moving;
+  }
+  *peak = top[ranks - 1];
+  *noise_sum = sum;
+}
+
+// The peak (tones_per_symbol-th largest value) and noise (mean of the values
+// below it) of every time t < count, four times per vector; the times are
+// independent and each lane does the scalar arithmetic.
+template <int kTop>
+void SelectPeaksOfTimes(const float* const* rows, int num_rows, int top_count, int count,
+                        float* peak, float* noise, audio_dsp::Float4* scratch) {
+  const int k = num_rows - top_count;
+  const float below = static_cast<float>(k);
+  audio_dsp::Float4 registers[kTop > 0 ? kTop : 1];
+  audio_dsp::Float4* top = kTop > 0 ? registers : scratch;
+  int t = 0;
+  for (; t + 4 <= count; t += 4) {
+    audio_dsp::Float4 p, sum;
+    RankTimes<kTop>(rows, num_rows, top_count, t, top, &p, &sum);
+    audio_dsp::Store4(peak + t, p);
+    audio_dsp::Store4(noise + t, k > 0 ? sum / below : sum);
+  }
+  for (; t < count; ++t) {
+    float tail_top[kTop > 0 ? kTop : 1];
+    std::vector<float> tail_scratch(kTop > 0 ? 0 : top_count);
+    float sum;
+    RankTimes<kTop>(rows, num_rows, top_count, t, kTop > 0 ? tail_top : tail_scratch.data(),
+                    &peak[t], &sum);
+    noise[t] = k > 0 ? sum / below : sum;
+  }
+}
+
 // The checks run before any member is built from the record.
 const DtmfDecoderParams& Validated(const DtmfDecoderParams& params) {
   ValidateDtmfEncoderParams(params);
@@ -186,9 +281,8 @@ void DtmfDecoder::ProcessSamples(const std::vector<float>& received_samples) {
     return;
   }
   CHECK(received_samples.size() % num_channels_ == 0);
-  // The mean of the channels.
   DownmixChannels(samples, static_cast<int>((count - first) / num_channels_), num_channels_,
-                  1.0f / static_cast<float>(num_channels_), &mono_);
+                  Downmix::kMean, &mono_);
   FeedMono(mono_);
 }
 
@@ -278,22 +372,25 @@ void DtmfDecoder::ScoreTimes(int first, int end) {
   column_max_.resize(count);
   // Four tones at a time, one per lane: the running maxima of the lanes are
   // independent and the maximum is exact, so each lane gets what MaxFilter
-  // of its own tone gives.
+  // of its own tone gives. Lanes beyond the last tone repeat it.
   tone_lanes_.resize(span);
+  running_max_.resize(span);
   for (int group = 0; group < num_frequencies_; group += 4) {
     const int lanes = std::min(4, num_frequencies_ - group);
+    const float* strengths[4];
+    float* maxima[4];
     for (int l = 0; l < 4; ++l) {
-      const float* strengths = tone_strength_buffers_[group + std::min(l, lanes - 1)].data() + from;
-      for (int t = 0; t < span; ++t) tone_lanes_[t][l] = strengths[t];
+      const int i = group + std::min(l, lanes - 1);
+      strengths[l] = tone_strength_buffers_[i].data() + from;
+      maxima[l] = normalized_rows_[i].mutable_data() + first;
     }
-    running_max_.resize(span);
+    RowsToLanes(strengths, span, tone_lanes_.data());
     audio_dsp::MaxFilter(tone_lanes_.data(), span, w, running_max_.data(), &max_filter_scratch_);
+    LanesToRows(running_max_.data() + (first - from), count, maxima);
     for (int l = 0; l < lanes; ++l) {
-      const int i = group + l;
-      float* x = normalized_rows_[i].mutable_data() + first;
-      for (int t = 0; t < count; ++t) x[t] = running_max_[first - from + t][l];
+      const float* x = maxima[l];
       // m: the strongest tone's running maximum at each time.
-      if (i == 0) {
+      if (group + l == 0) {
         std::copy(x, x + count, column_max_.begin());
       } else {
 #pragma omp simd
@@ -344,37 +441,16 @@ void DtmfDecoder::SelectPeaks(const float* const* rows, int count, float* peak, 
   // noise.
   const int k = std::max(0, num_frequencies_ - params_.tones_per_symbol);
   const int top_count = num_frequencies_ - k;
-  // A selection, not a sort, run for all times at once, tone by tone (the
-  // times are independent, so the loops vectorise): each tone's value
-  // bubbles through the top_count largest so far (largest first); what falls
-  // out of the last place is one of the k values below position k of the
-  // ascending order, and goes to the noise sum.
-  top_.assign(static_cast<size_t>(top_count) * count, -std::numeric_limits<float>::infinity());
-  std::fill(noise, noise + count, 0.0f);
-  float* __restrict noise_sum = noise;
-  moving_.resize(count);
-  float* __restrict moving = moving_.data();
-  for (int i = 0; i < num_frequencies_; ++i) {
-    std::copy(rows[i], rows[i] + count, moving);
-    for (int j = 0; j < top_count; ++j) {
-      float* __restrict kept = top_.data() + static_cast<size_t>(j) * count;
-#pragma omp simd
-      for (int t = 0; t < count; ++t) {
-        const float larger = std::max(moving[t], kept[t]);
-        moving[t] = std::min(moving[t], kept[t]);
-        kept[t] = larger;
-      }
-    }
-    if (i >= top_count) {
-#pragma omp simd
-      for (int t = 0; t < count; ++t) noise_sum[t] += moving[t];
-    }
+  switch (top_count) {
+    case 1:
+      return SelectPeaksOfTimes<1>(rows, num_frequencies_, top_count, count, peak, noise, nullptr);
+    case 2:
+      return SelectPeaksOfTimes<2>(rows, num_frequencies_, top_count, count, peak, noise, nullptr);
+    case 3:
+      return SelectPeaksOfTimes<3>(rows, num_frequencies_, top_count, count, peak, noise, nullptr);
   }
-  const float* last = top_.data() + static_cast<size_t>(top_count - 1) * count;
-  std::copy(last, last + count, peak);
-  if (k > 0) {
-    for (int t = 0; t < count; ++t) noise[t] /= static_cast<float>(k);
-  }
+  top_.resize(top_count);
+  SelectPeaksOfTimes<0>(rows, num_frequencies_, top_count, count, peak, noise, top_.data());
 }
 
 void DtmfDecoder::FinishAcquisitionScores(const float* peak,
@@ -384,7 +460,10 @@ void DtmfDecoder::FinishAcquisitionScores(const float* peak,
   SmoothNoiseEstimate(&noise_);
   acquisition_scores->resize(n);
   float* scores = acquisition_scores->data();
-  for (int t = 0; t < n; ++t) scores[t] = peak[t] / (noise_[t] + kNoiseFloor);
+  const float* noise = noise_.data();
+  // Element by element (peak may be *acquisition_scores itself).
+#pragma omp simd
+  for (int t = 0; t < n; ++t) scores[t] = peak[t] / (noise[t] + kNoiseFloor);
 }
 
 void DtmfDecoder::SmoothNoiseEstimate(std::vector<float>* noise) {
@@ -412,10 +491,11 @@ void DtmfDecoder::SmoothNoiseEstimate(std::vector<float>* noise) {
     tail_mean = static_cast<float>(tail / delay);
   }
   noise_filter_.Reset(head_mean);
-  for (int k = 0; k < delay; ++k) noise_filter_.Step(values[k]);
+  noise_filter_.Process(values.data(), delay, nullptr);
   // In place: value k - delay is written after value k was read.
-  for (int k = delay; k < n; ++k) values[k - delay] = noise_filter_.Step(values[k]);
-  for (int k = n - delay; k < n; ++k) values[k] = noise_filter_.Step(tail_mean);
+  noise_filter_.Process(values.data() + delay, n - delay, values.data());
+  std::fill(values.begin() + (n - delay), values.end(), tail_mean);
+  noise_filter_.Process(values.data() + (n - delay), delay, values.data() + (n - delay));
 }
 
 int DtmfDecoder::ComputeStartOffset(const std::vector<float>& acquisition_scores) const {
@@ -424,9 +504,11 @@ int DtmfDecoder::ComputeStartOffset(const std::vector<float>& acquisition_scores
   const int num_symbols = n / period;
   std::vector<double>& folded = folded_;
   std::fill(folded.begin(), folded.end(), 0.0);
+  double* sums = folded.data();
   for (int j = 0; j < num_symbols; ++j) {
     const float* symbol = acquisition_scores.data() + static_cast<size_t>(j) * period;
-    for (int p = 0; p < period; ++p) folded[p] += symbol[p];
+#pragma omp simd
+    for (int p = 0; p < period; ++p) sums[p] += symbol[p];
   }
   const std::complex<double> step = std::polar(1.0, 2.0 * M_PI / period);
   std::complex<double> power = 1.0;

@@ -28,10 +28,12 @@
 // happens at construction and Init, and the per-block and per-request paths
 // reuse member buffers once they have reached the history's size (a request
 // builds only its candidate map, a few dozen entries, and its results).
-// Cost: per input sample one filter step per tone (four tones per vector);
-// per request, normalisation and peak selection of the times that new
-// strengths reach (and, after the history moved, of the oldest window), then
-// O(history) for the noise smoothing, the timing and the candidates.
+// Cost: per input sample one filter step per tone (up to ten tones side by
+// side, see ToneStrengthFilter::ProcessAll); per request, normalisation and
+// peak selection of the times that new strengths reach (and, after the
+// history moved, of the oldest window), four times per vector, then
+// O(history) for the noise smoothing (a recursion, one step per time and
+// stage, that no vector shortens), the timing and the candidates.
 // Not thread-safe: one thread at a time.
 
 #ifndef AUDIO_VESKNET_DTMF_DTMF_DECODER_H_
@@ -289,10 +291,9 @@ class DtmfDecoder {
   std::vector<audio_dsp::Float4> running_max_;      // Their running maxima.
   std::vector<audio_dsp::Float4> max_filter_scratch_;
   std::vector<float> column_max_;
-  std::vector<const float*> rows_;  // Tone rows handed to SelectPeaks.
-  std::vector<float> tone_major_;   // ComputeAcquisitionScores' input, tone after tone.
-  std::vector<float> top_;          // The largest values of each time, rank after rank.
-  std::vector<float> moving_;       // One tone's values on their way through top_.
+  std::vector<const float*> rows_;      // Tone rows handed to SelectPeaks.
+  std::vector<float> tone_major_;       // ComputeAcquisitionScores' input, tone after tone.
+  std::vector<audio_dsp::Float4> top_;  // SelectPeaks' ranks, for many tones per symbol.
   std::vector<float> noise_;
   std::vector<float> acquisition_scores_;
   audio_dsp::MatrixXf scores_table_;

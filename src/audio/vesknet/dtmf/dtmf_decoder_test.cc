@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <cmath>
+#include <string>
+#include <utility>
 #include <vector>
 
 #include "audio/dsp/max_filter.h"
@@ -73,6 +75,23 @@ TEST(DtmfDecoderTest, DecodesCleanTokensWhateverTheChunking) {
   EXPECT_TRUE(decoder.has_resampler());
 }
 
+// The tone filters pass one symbol's envelope, 0.594 cycles per symbol
+// duration (0.594 x 44100 / 2208 = 11.864 Hz), plus the Doppler shift of the
+// highest tone (2489.05 Hz x 1 m/s / 340 m/s = 7.321 Hz). A token is its
+// spacer, 8 data symbols and the checksum symbol: 10 x 2208 samples at
+// 44.1 kHz, round(10 x 48000 x 2208 / 44100) = 24033 samples at 48 kHz.
+TEST(DtmfDecoderTest, FilterBandwidthAndTokenLength) {
+  DtmfDecoderParams params = ProductParams();
+  DtmfDecoder decoder(params);
+  EXPECT_NEAR(decoder.tone_filter_bandwidth(), 11.86386, 1e-4);
+  decoder.Init(44100.0f, 1);
+  EXPECT_EQ(decoder.token_length_received_samples(), 22080);
+  decoder.Init(48000.0f, 2);
+  EXPECT_EQ(decoder.token_length_received_samples(), 24033);
+  params.max_meters_per_second = 1.0f;
+  EXPECT_NEAR(DtmfDecoder(params).tone_filter_bandwidth(), 11.86386 + 7.32075, 1e-4);
+}
+
 TEST(DtmfDecoderTest, CustomToneListIsHeard) {
   DtmfEncoderParams params;
   params.append_checksum_symbol = true;
@@ -114,22 +133,35 @@ TEST(DtmfDecoderTest, SymbolsBeyondTheByteSpaceAreDropped) {
   EXPECT_TRUE(sound(std::vector<int32_t>(8, 43)).empty());
 }
 
+// Channels are averaged by dividing their sum by the count: with three, a
+// product with 1/3 would differ in the last bit of some samples, and so in
+// the strengths.
 TEST(DtmfDecoderTest, ChannelsAreAveragedAndMonoIsTakenAsItIs) {
-  const std::vector<float> mono = Noise(5000, 7, 3000.0f);
-  std::vector<float> stereo;
-  for (const float x : mono) stereo.insert(stereo.end(), {2.0f * x, 0.0f});
-  DtmfDecoder one(ProductParams()), two(ProductParams());
+  const std::vector<float> a = Noise(5000, 7, 3000.0f), b = Noise(5000, 8, 3000.0f),
+                           c = Noise(5000, 9, 3000.0f);
+  std::vector<float> stereo, three, mean_of_three;
+  for (int i = 0; i < 5000; ++i) {
+    stereo.insert(stereo.end(), {2.0f * a[i], 0.0f});
+    three.insert(three.end(), {a[i], b[i], c[i]});
+    mean_of_three.push_back((a[i] + b[i] + c[i]) / 3.0f);
+  }
+  DtmfDecoder one(ProductParams()), two(ProductParams()), trio(ProductParams());
   one.Init(44100.0f, 1);
   two.Init(44100.0f, 2);
-  one.ProcessSamples(mono);
+  trio.Init(44100.0f, 3);
+  one.ProcessSamples(a);
   two.ProcessSamples(stereo);
-  ToneStrengthFilter filter(44100.0f, one.params().tone_frequencies[3], one.tone_filter_bandwidth(),
-                            16);
-  std::vector<float> expected;
-  filter.Process(mono, &expected);
+  trio.ProcessSamples(three);
+  const float frequency = one.params().tone_frequencies[3];
+  ToneStrengthFilter filter(44100.0f, frequency, one.tone_filter_bandwidth(), 16),
+      filter_of_mean(44100.0f, frequency, one.tone_filter_bandwidth(), 16);
+  std::vector<float> expected, expected_of_mean;
+  filter.Process(a, &expected);
+  filter_of_mean.Process(mean_of_three, &expected_of_mean);
   EXPECT_EQ(one.tone_strength_buffer_size(), 5000 / 16);
   EXPECT_EQ(one.ToneStrengths(3), expected);
   EXPECT_EQ(two.ToneStrengths(3), expected);
+  EXPECT_EQ(trio.ToneStrengths(3), expected_of_mean);
   EXPECT_DEATH(two.ProcessSamples(std::vector<float>(3, 1.0f)),
                "Check failed: received_samples\\.size\\(\\) % num_channels_ == 0");
 }
@@ -252,6 +284,82 @@ TEST(DtmfDecoderTest, ShortNoiseVectorBecomesItsMeanAndLongOneIsAligned) {
   EXPECT_LT(step[2000], 2.4f);
 }
 
+// The smoother's delay with the defaults: sigma = 2 x 138 = 276 baseband
+// samples over 2 stages gives the pole a = 0.9948891 (v = 276^2 / 2, a = (1 -
+// sqrt(4v + 1)) / 2v + 1) and the delay round(2a / (1 - a)) = round(389.32) =
+// 389. An impulse at 1000 then comes out from 1000 - 389 = 611 on, as the
+// two-stage response (1 - a)^2 (m + 1) a^m.
+TEST(DtmfDecoderTest, SmootherMovesAnImpulseBackByItsDelay) {
+  DtmfDecoder decoder(ProductParams());
+  std::vector<float> noise(3000, 0.0f);
+  noise[1000] = 1.0f;
+  decoder.SmoothNoiseEstimate(&noise);
+  const double a = 0.9948891485, g = 1.0 - a;
+  EXPECT_EQ(noise[610], 0.0f);
+  for (const int m : {0, 1, 100, 194, 389, 1000}) {
+    const double expected = g * g * (m + 1) * std::pow(a, m);
+    EXPECT_NEAR(noise[611 + m], expected, 1e-4 * expected) << m;
+  }
+}
+
+// The ends: the filter starts from the mean of the first delay values (fed
+// through it first) and is run out on the mean of the last delay values;
+// written here as one filter pass over the input with the tail mean
+// appended, read from the delay on.
+TEST(DtmfDecoderTest, SmootherPadsWithTheMeansOfItsEnds) {
+  DtmfDecoder decoder(ProductParams());
+  const int delay = 389, n = 1000;
+  std::vector<float> noise(n);
+  uint32_t seed = 11;
+  for (float& x : noise) {
+    seed = seed * 1664525u + 1013904223u;
+    x = 1.0f + static_cast<float>(seed >> 8) / 16777216.0f;
+  }
+  double head = 0.0, tail = 0.0;
+  for (int k = 0; k < delay; ++k) {
+    head += noise[k];
+    tail += noise[n - delay + k];
+  }
+  std::vector<float> padded = noise;
+  padded.resize(n + delay, static_cast<float>(tail / delay));
+  audio_dsp::GammaFilter filter =
+      audio_dsp::GammaFilterFromStddev(decoder.baseband_sample_rate(), 2, 2.0 * kP);
+  ASSERT_EQ(filter.Delay(), delay);
+  filter.Reset(static_cast<float>(head / delay));
+  std::vector<float> expected;
+  for (int k = 0; k < n + delay; ++k) {
+    const float y = filter.Step(padded[k]);
+    if (k >= delay) expected.push_back(y);
+  }
+  decoder.SmoothNoiseEstimate(&noise);
+  for (int k = 0; k < n; ++k) ASSERT_NEAR(noise[k], expected[k], 1e-6) << k;
+}
+
+// Ten tones at three times, by hand. The peak is the second largest value
+// (tones_per_symbol = 2; ties count twice) and the noise the mean of the
+// eight below it: (9, 4.5), (7, 2.6875), (2.25, 1.125). Three times are fewer
+// than the smoother's delay, so the noise becomes its mean, 8.3125 / 3.
+TEST(DtmfDecoderTest, AcquisitionScoreIsSecondLargestOverTheMeanOfTheRest) {
+  DtmfDecoder decoder(ProductParams());
+  decoder.Init(44100.0f, 1);
+  decoder.ProcessSamples(std::vector<float>(3 * 16, 0.0f));
+  ASSERT_EQ(decoder.tone_strength_buffer_size(), 3);
+  const float columns[3][10] = {{1, 2, 3, 4, 5, 6, 7, 8, 9, 10},
+                                {5, 0.5f, 7, 3, 7, 1, 2, 0, 4, 6},
+                                {0.25f, 8, 0.5f, 0.75f, 1, 1.25f, 1.5f, 1.75f, 2, 2.25f}};
+  audio_dsp::MatrixXf tones(10, 3);
+  for (int t = 0; t < 3; ++t) {
+    for (int i = 0; i < 10; ++i) tones(i, t) = columns[t][i];
+  }
+  std::vector<float> acquisition;
+  decoder.ComputeAcquisitionScores(tones, &acquisition);
+  const double noise = 8.3125 / 3;
+  ASSERT_EQ(acquisition.size(), 3u);
+  EXPECT_FLOAT_EQ(acquisition[0], 9 / noise);
+  EXPECT_FLOAT_EQ(acquisition[1], 7 / noise);
+  EXPECT_FLOAT_EQ(acquisition[2], 2.25 / noise);
+}
+
 TEST(DtmfDecoderTest, StartOffsetIsThePositionOfThePeakInsideASymbol) {
   const DtmfDecoder decoder(ProductParams());
   for (const int peak : {5, kP - 1, 0}) {
@@ -290,6 +398,14 @@ TEST(DtmfDecoderTest, CandidatesAreKeyedBySymbolAndEndsStandAlone) {
   EXPECT_EQ(candidates[0].size(), 45u);
   EXPECT_EQ(candidates[0][0], 1.0f);
   EXPECT_EQ(candidates[0][44], 9.0f);
+  // From start 0 the grid point P is still within a symbol of the start and
+  // 4P within one of the end (4P + P = n): both stand alone.
+  std::fill(acquisition.begin(), acquisition.end(), 0.0f);
+  acquisition[kP] = acquisition[4 * kP] = 3.0f;
+  decoder.FindCandidates(tones, acquisition, 0, &candidates);
+  keys.clear();
+  for (const auto& entry : candidates) keys.push_back(entry.first);
+  EXPECT_EQ(keys, (std::vector<int>{1, 4}));
   EXPECT_DEATH(decoder.FindCandidates(tones, std::vector<float>(3), 5, &candidates),
                "Check failed: acquisition_scores\\.size\\(\\) == tone_strength_buffer_size_");
 }
@@ -325,19 +441,40 @@ TEST(DtmfDecoderTest, CallsBeforeInitAreLoggedAndIgnored) {
   EXPECT_FALSE(decoder.initialized());
 }
 
+// Every receiver field's range, in the order checked; the transmitter's
+// checks come first.
 TEST(DtmfDecoderDeathTest, ChecksRejectBadParametersAndRates) {
-  DtmfDecoderParams params = ProductParams();
-  params.tone_normalization_params.division_floor = -1.0f;
-  EXPECT_DEATH(DtmfDecoder{params},
-               "Check failed: params\\.tone_normalization_params\\.division_floor >= 0\\.0");
-  params = ProductParams();
-  params.max_candidates_per_decode_token_call = 0;
-  EXPECT_DEATH(DtmfDecoder{params},
-               "Check failed: params\\.max_candidates_per_decode_token_call > 0");
-  params = ProductParams();
-  params.sample_rate = 0.0f;  // The transmitter's checks come first.
-  params.max_buffer_duration_in_seconds = 0.0f;
-  EXPECT_DEATH(DtmfDecoder{params}, "Check failed: params\\.sample_rate > 0\\.0f");
+  using Params = DtmfDecoderParams;
+  const std::vector<std::pair<void (*)(Params*), const char*>> cases = {
+      {[](Params* p) { p->max_meters_per_second = -1; }, "params\\.max_meters_per_second >= 0\\.0"},
+      {[](Params* p) { p->max_buffer_duration_in_seconds = 0; },
+       "params\\.max_buffer_duration_in_seconds > 0\\.0"},
+      {[](Params* p) { p->tone_normalization_params.window_size = -1; },
+       "params\\.tone_normalization_params\\.window_size >= 0\\.0"},
+      {[](Params* p) { p->tone_normalization_params.cross_frequency_weight = -1; },
+       "params\\.tone_normalization_params\\.cross_frequency_weight >= 0\\.0"},
+      {[](Params* p) { p->tone_normalization_params.division_floor = -1; },
+       "params\\.tone_normalization_params\\.division_floor >= 0\\.0"},
+      {[](Params* p) { p->noise_estimate_filter_order = 0; },
+       "params\\.noise_estimate_filter_order > 0"},
+      {[](Params* p) { p->noise_estimate_filter_stddev = 0; },
+       "params\\.noise_estimate_filter_stddev > 0\\.0"},
+      {[](Params* p) { p->acquisition_threshold = -1; }, "params\\.acquisition_threshold >= 0\\.0"},
+      {[](Params* p) { p->max_candidates_rank = 0; }, "params\\.max_candidates_rank > 0"},
+      {[](Params* p) { p->max_candidates_per_decode_token_call = 0; },
+       "params\\.max_candidates_per_decode_token_call > 0"},
+      {[](Params* p) { p->token_threshold_factor = -1; }, "params\\.token_threshold_factor >= 0"},
+      {[](Params* p) {
+         p->sample_rate = 0;
+         p->max_buffer_duration_in_seconds = 0;
+       },
+       "params\\.sample_rate > 0\\.0f"},
+  };
+  for (const auto& [spoil, text] : cases) {
+    Params params = ProductParams();
+    spoil(&params);
+    EXPECT_DEATH(DtmfDecoder{params}, std::string("Check failed: ") + text) << text;
+  }
   DtmfDecoder decoder(ProductParams());
   EXPECT_DEATH(decoder.Init(0.0f, 1), "Check failed: received_sample_rate > 0\\.0");
   EXPECT_DEATH(decoder.Init(44100.0f, 0), "Check failed: num_channels >= 1");

@@ -2,6 +2,7 @@
 
 #include <cmath>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "base/scoped_log_capture.h"
@@ -26,6 +27,15 @@ TEST(DtmfEncoderParamsTest, Defaults) {
 
   params.sample_rate = 48000;  // 150 decimated samples exactly.
   EXPECT_EQ(GetFrameSize(params), 2400);
+  // Halves round away from zero: 0.03125 x 44288 / 16 = 86.5 -> 87 (not the
+  // even 86), and 87.5 -> 88.
+  params.window_duration = 0.03125f;
+  params.sample_rate = 44288;
+  EXPECT_EQ(GetFrameSize(params), 87 * 16);
+  params.sample_rate = 44800;
+  EXPECT_EQ(GetFrameSize(params), 88 * 16);
+  params.window_duration = 0.05f;
+  params.sample_rate = 48000;
   params.append_checksum_symbol = true;
   EXPECT_FLOAT_EQ(GetTokenDurationSeconds(params), 10 * 2400 / 48000.0f);
 }
@@ -58,6 +68,13 @@ TEST(DtmfEncoderParamsTest, Windows) {
   EXPECT_TRUE(SetAdsrWindow(0.01f, 0.01f, 0.02f, 0.01f, 1.0f, &params));
   EXPECT_TRUE(SetAdsrWindow(std::nanf(""), 0, 0, 0, 1.0f, &params));
   EXPECT_TRUE(SetAdsrWindow(0.025f, 0, 0, 0.025f, 1.0f, &params));
+  // Times that add up to one float step above 0.05f (0x1.99999cp-5) pass;
+  // the tolerance reaches 0.05f x (1 + 4 x 2^-23), 0x1.9999a6p-5 after
+  // rounding, and the next float is refused.
+  EXPECT_TRUE(SetAdsrWindow(0.001f, 0.007f, 0.017f, 0.025f, 1.0f, &params));
+  EXPECT_TRUE(SetAdsrWindow(0x1.9999a6p-5f, 0, 0, 0, 1.0f, &params));
+  base::ScopedLogCapture capture;
+  EXPECT_FALSE(SetAdsrWindow(0x1.9999a8p-5f, 0, 0, 0, 1.0f, &params));
 }
 
 TEST(DtmfEncoderParamsTest, AdsrRefusalsAreLoggedAndChangeNothing) {
@@ -94,28 +111,53 @@ TEST(DtmfEncoderParamsTest, ToneCombinations) {
   ValidateDtmfEncoderParams(params);
 }
 
+// Every check, in the order they run, on a record spoilt in one place.
 TEST(DtmfEncoderParamsDeathTest, Validation) {
-  DtmfEncoderParams params;
-  SetDefaultWindow(&params);
-  DtmfEncoderParams p = params;
-  p.window_samples.pop_back();
-  EXPECT_DEATH(
-      ValidateDtmfEncoderParams(p),
-      "Check failed: static_cast<int>\\(params.window_samples.size\\(\\)\\) == frame_size");
-  p = params;
-  p.tone_frequencies[3] = 22050;
-  EXPECT_DEATH(ValidateDtmfEncoderParams(p), "Check failed: frequency < nyquist_frequency");
-  p = params;
-  p.symbol_table.resize(2);
-  p.spacer_symbol = 1;
-  EXPECT_DEATH(ValidateDtmfEncoderParams(p), "Check failed: params.symbol_table.size\\(\\) >= 3");
-  p = params;
-  MakeToneCombinations({500, 600, 700, 800}, 2, &p);  // All 6 pairs of 4 tones...
-  p.symbol_table.push_back({0, 1});                   // ...and a seventh row.
-  EXPECT_DEATH(
-      ValidateDtmfEncoderParams(p),
-      "Check failed: params.tone_frequencies.size\\(\\) \\* "
-      "\\(params.tone_frequencies.size\\(\\) - 1\\) / 2 >= params.symbol_table.size\\(\\)");
+  using Params = DtmfEncoderParams;
+  const std::vector<std::pair<void (*)(Params*), const char*>> cases = {
+      {[](Params* p) { p->sample_rate = 0; }, "params\\.sample_rate > 0\\.0f"},
+      {[](Params* p) { p->baseband_decimation_factor = 0; },
+       "params\\.baseband_decimation_factor > 0"},
+      {[](Params* p) { p->window_duration = 0; }, "params\\.window_duration > 0\\.0f"},
+      {[](Params* p) { p->window_duration = 1e-4f; }, "frame_size > 0"},  // 0.28 -> 0 samples.
+      {[](Params* p) { p->window_samples.pop_back(); },
+       "static_cast<int>\\(params\\.window_samples\\.size\\(\\)\\) == frame_size"},
+      {[](Params* p) { p->window_samples[7] = std::nanf(""); }, "std::isfinite\\(sample\\)"},
+      {[](Params* p) { p->window_samples[7] = -0.5f; }, "sample >= 0\\.0"},
+      {[](Params* p) { p->tone_frequencies[2] = -1; }, "frequency >= 0\\.0"},
+      {[](Params* p) { p->tone_frequencies[3] = 22050; }, "frequency < nyquist_frequency"},
+      {[](Params* p) {
+         p->symbol_table.resize(2);
+         p->spacer_symbol = 1;
+       },
+       "params\\.symbol_table\\.size\\(\\) >= 3"},
+      {[](Params* p) {
+         MakeToneCombinations({500, 600, 700, 800}, 2, p);  // All 6 pairs of 4 tones...
+         p->symbol_table.push_back({0, 1});                 // ...and a seventh row.
+       },
+       "params\\.tone_frequencies\\.size\\(\\) \\* "
+       "\\(params\\.tone_frequencies\\.size\\(\\) - 1\\) / 2 >= "
+       "params\\.symbol_table\\.size\\(\\)"},
+      {[](Params* p) { p->tones_per_symbol = 0; }, "params\\.tones_per_symbol > 0"},
+      {[](Params* p) { p->symbol_table[5].push_back(3); },
+       "static_cast<int>\\(symbol_frequencies\\.size\\(\\)\\) == params\\.tones_per_symbol"},
+      {[](Params* p) { p->symbol_table[5][0] = -1; }, "index >= 0"},
+      {[](Params* p) { p->symbol_table[5][1] = 10; },
+       "index < static_cast<int>\\(params\\.tone_frequencies\\.size\\(\\)\\)"},
+      {[](Params* p) { p->spacer_symbol = -1; }, "params\\.spacer_symbol >= 0"},
+      {[](Params* p) { p->spacer_symbol = 45; },
+       "params\\.spacer_symbol < static_cast<int>\\(params\\.symbol_table\\.size\\(\\)\\)"},
+      {[](Params* p) { p->bytes_in_token = 0; }, "params\\.bytes_in_token > 0"},
+      {[](Params* p) { p->max_amplitude = 0; }, "params\\.max_amplitude > 0\\.0"},
+  };
+  Params valid;
+  SetDefaultWindow(&valid);
+  ValidateDtmfEncoderParams(valid);
+  for (const auto& [spoil, text] : cases) {
+    Params params = valid;
+    spoil(&params);
+    EXPECT_DEATH(ValidateDtmfEncoderParams(params), std::string("Check failed: ") + text) << text;
+  }
 }
 
 }  // namespace

@@ -54,6 +54,38 @@ TEST(DtmfEncoderTest, DefaultTokenIsNineFramesOfTwoTones) {
   }
 }
 
+// Every frame is the window times the plain sum of its symbol's tones, each
+// sin(i x 2 pi f / sample_rate) from phase zero at the frame's first sample,
+// the whole token scaled to a peak of max_amplitude.
+TEST(DtmfEncoderTest, FramesAreWindowedSumsOfSinesFromPhaseZero) {
+  DtmfEncoderParams params;
+  params.max_amplitude = 0.8f;
+  const DtmfEncoder encoder(params);
+  const std::vector<uint8_t> token = {0xA5, 0x00, 0x3C, 0xFF, 0x12};
+  std::vector<float> audio;
+  encoder.EncodeToken(token, &audio);
+  Symbols on_air = encoder.converter().BytesToSymbols(token);
+  on_air.insert(on_air.begin(), 44);
+  const int n = 2208;
+  ASSERT_EQ(audio.size(), on_air.size() * n);
+  std::vector<double> expected;
+  double peak = 0.0;
+  for (const int32_t symbol : on_air) {
+    for (int i = 0; i < n; ++i) {
+      double sum = 0.0;
+      for (const int32_t tone : params.symbol_table[symbol]) {
+        sum += std::sin(i * 2 * M_PI * params.tone_frequencies[tone] / 44100);
+      }
+      expected.push_back(sum * std::sin(M_PI * i / n));  // The half-sine window.
+      peak = std::max(peak, std::fabs(expected.back()));
+    }
+  }
+  for (size_t i = 0; i < audio.size(); ++i) {
+    ASSERT_NEAR(audio[i], 0.8 * expected[i] / peak, 2e-4)
+        << "frame " << i / n << " sample " << i % n;
+  }
+}
+
 TEST(DtmfEncoderTest, ChecksumFrameAndAmplitude) {
   DtmfEncoderParams params;
   params.append_checksum_symbol = true;
@@ -100,6 +132,10 @@ TEST(DtmfEncoderDeathTest, Preconditions) {
   EXPECT_DEATH(encoder.EncodeSymbols(Symbols(8, 43), &audio),
                "Check failed: IsValidSymbolSequence\\(token_message_symbols\\)");
   EXPECT_DEATH(encoder.EncodeSymbols(Symbols(8, 0), nullptr), "Check failed: audio_samples");
+  // The symbol indexes the symbol table.
+  EXPECT_DEATH(encoder.SynthesizeSymbol(-1, &audio), "Check failed: symbol >= 0");
+  EXPECT_DEATH(encoder.SynthesizeSymbol(45, &audio), "Check failed: symbol < alphabet_size_");
+  EXPECT_DEATH(encoder.SynthesizeSymbol(0, nullptr), "Check failed: result");
 }
 
 }  // namespace

@@ -4,6 +4,7 @@
 #include <array>
 #include <cmath>
 #include <cstddef>
+#include <cstring>
 #include <limits>
 
 #include "audio/dsp/simd.h"
@@ -41,6 +42,45 @@ const float* GetSineTable() {
   }();
   return table.data();
 }
+
+// The table again as (sine, cosine) pairs, entries i and i + 1024: one
+// eight-byte load gives both arms of a filter. The same values, shared and
+// immutable like the table.
+struct SineCosine {
+  float sine;
+  float cosine;
+};
+static_assert(sizeof(SineCosine) == 8, "two floats per entry");
+
+const SineCosine* GetSineCosineTable() {
+  static const std::array<SineCosine, kTablePeriod> pairs = [] {
+    const float* table = GetSineTable();
+    std::array<SineCosine, kTablePeriod> entries;
+    for (int i = 0; i < kTablePeriod; ++i) entries[i] = {table[i], table[i + kQuarterPeriod]};
+    return entries;
+  }();
+  return pairs.data();
+}
+
+// (sine, cosine) of entry a in lanes 0, 1 and of entry b in lanes 2, 3.
+inline audio_dsp::Float4 LoadTwoPairs(const SineCosine* pairs, uint32_t a, uint32_t b) {
+  double low, high;  // Eight bytes each, moved as they are.
+  std::memcpy(&low, pairs + a, sizeof(low));
+  std::memcpy(&high, pairs + b, sizeof(high));
+  const audio_dsp::Double2 both = {low, high};
+  audio_dsp::Float4 lanes;
+  std::memcpy(&lanes, &both, sizeof(lanes));
+  return lanes;
+}
+
+// Filters run side by side at most: ten (five vectors of sine and cosine
+// sums, three of phases) where there are sixteen or more vector registers,
+// four where there are eight (32-bit x86).
+#if defined(__x86_64__) || defined(__aarch64__) || defined(__wasm__)
+constexpr int kMaxPairs = 5;
+#else
+constexpr int kMaxPairs = 2;
+#endif
 
 // round(value) half away from zero, saturated to the int32 range.
 int32_t RoundToInt32(double value) {
@@ -138,8 +178,6 @@ void ToneStrengthFilter::Process(const std::vector<float>& input,
 
 void ToneStrengthFilter::ProcessAll(ToneStrengthFilter* filters, int count,
                                     const std::vector<float>& input, std::vector<float>* outputs) {
-  using audio_dsp::Float4;
-  typedef uint32_t UInt4 __attribute__((vector_size(16)));
   CHECK(outputs);
   bool lockstep = true;
   for (int i = 1; i < count; ++i) {
@@ -151,85 +189,125 @@ void ToneStrengthFilter::ProcessAll(ToneStrengthFilter* filters, int count,
     return;
   }
   // Sized for the most strengths the input can complete and cut to what it
-  // did: no call inside the loop, so the vectors stay in registers.
+  // did: no call inside the loop, so the sums stay in registers.
   const size_t most = input.size() / filters[0].decimation_factor_ + 1;
   for (int i = 0; i < count; ++i) outputs[i].resize(most);
   size_t produced = 0;
-  // Four filters per vector, lane l being filter first + l: each lane does
-  // Process's arithmetic in its order. Lanes beyond the last filter run on a
-  // zero increment and gain and are not written back.
-  for (int first = 0; first < count; first += 4) {
-    const int lanes = std::min(4, count - first);
-    const ToneStrengthFilter* f = filters + first;
-    UInt4 phase = {}, increment = {};
-    Float4 cosine_sum = {}, sine_sum = {}, gain = {}, i1 = {}, q1 = {}, i2 = {}, q2 = {};
-    for (int l = 0; l < lanes; ++l) {
-      phase[l] = f[l].phase_;
-      increment[l] = f[l].phase_increment_;
-      cosine_sum[l] = f[l].cosine_sum_;
-      sine_sum[l] = f[l].sine_sum_;
-      gain[l] = f[l].gain_;
-      i1[l] = f[l].i1_;
-      q1[l] = f[l].q1_;
-      i2[l] = f[l].i2_;
-      q2[l] = f[l].q2_;
-    }
-    const float* const table = f[0].sine_table_;
-    const int32_t decimation = f[0].decimation_factor_;
-    int32_t countdown = f[0].countdown_;
-    float* out[4];
-    for (int l = 0; l < 4; ++l) out[l] = outputs[first + std::min(l, lanes - 1)].data();
-    size_t written = 0;
-    const float* samples = input.data();
-    size_t remaining = input.size();
-    while (remaining > 0) {
-      const int32_t run = static_cast<int32_t>(std::min<size_t>(remaining, countdown));
-      for (int32_t j = 0; j < run; ++j) {
-        const float x = samples[j];
-        const UInt4 index = phase >> kPhaseShift;
-        const Float4 cosine = {table[index[0] + kQuarterPeriod], table[index[1] + kQuarterPeriod],
-                               table[index[2] + kQuarterPeriod], table[index[3] + kQuarterPeriod]};
-        const Float4 sine = {table[index[0]], table[index[1]], table[index[2]], table[index[3]]};
-        cosine_sum += cosine * x;
-        sine_sum += x * sine;
-        phase += increment;
-      }
-      samples += run;
-      remaining -= run;
-      countdown -= run;
-      if (countdown == 0) {
-        const Float4 in_phase = cosine_sum, quadrature = sine_sum;
-        cosine_sum = Float4{};
-        sine_sum = Float4{};
-        countdown = decimation;
-        i1 += (in_phase - i1) * gain;
-        q1 += (quadrature - q1) * gain;
-        i2 += (i1 - i2) * gain;
-        q2 += (q1 - q2) * gain;
-        const Float4 strength = i2 * i2 + q2 * q2;
-        // Lanes beyond the last filter write into the last filter's output
-        // before its own lane does (highest lane first).
-        out[3][written] = strength[3];
-        out[2][written] = strength[2];
-        out[1][written] = strength[1];
-        out[0][written] = strength[0];
-        ++written;
-      }
-    }
-    produced = written;
-    for (int l = 0; l < lanes; ++l) {
-      ToneStrengthFilter& filter = filters[first + l];
-      filter.phase_ = phase[l];
-      filter.cosine_sum_ = cosine_sum[l];
-      filter.sine_sum_ = sine_sum[l];
-      filter.countdown_ = countdown;
-      filter.i1_ = i1[l];
-      filter.q1_ = q1[l];
-      filter.i2_ = i2[l];
-      filter.q2_ = q2[l];
+  for (int first = 0; first < count; first += 2 * kMaxPairs) {
+    const int lanes = std::min(2 * kMaxPairs, count - first);
+    ToneStrengthFilter* const f = filters + first;
+    std::vector<float>* const out = outputs + first;
+    switch ((lanes + 1) / 2) {
+      case 1:
+        ProcessPairs<1>(f, lanes, input, out, &produced);
+        break;
+      case 2:
+        ProcessPairs<2>(f, lanes, input, out, &produced);
+        break;
+#if defined(__x86_64__) || defined(__aarch64__) || defined(__wasm__)
+      case 3:
+        ProcessPairs<3>(f, lanes, input, out, &produced);
+        break;
+      case 4:
+        ProcessPairs<4>(f, lanes, input, out, &produced);
+        break;
+      case 5:
+        ProcessPairs<5>(f, lanes, input, out, &produced);
+        break;
+#endif
     }
   }
   for (int i = 0; i < count; ++i) outputs[i].resize(produced);
+}
+
+template <int kPairs>
+void ToneStrengthFilter::ProcessPairs(ToneStrengthFilter* filters, int lanes,
+                                      const std::vector<float>& input, std::vector<float>* outputs,
+                                      size_t* produced) {
+  using audio_dsp::Float4;
+  typedef uint32_t UInt4 __attribute__((vector_size(16)));
+  // Filter l: phase and low-pass in lane l % 4 of vector l / 4; sine and
+  // cosine sums in lanes 2 (l % 2) and 2 (l % 2) + 1 of sums[l / 2]. Each
+  // lane does Process's arithmetic in its order (a product is the same
+  // whichever factor comes first). Lanes beyond the last filter run on a zero
+  // increment and gain and are not written back.
+  constexpr int kVectors = (kPairs + 1) / 2;
+  UInt4 phase[kVectors] = {}, increment[kVectors] = {};
+  Float4 sums[kPairs] = {};
+  Float4 gain[kVectors] = {}, i1[kVectors] = {}, q1[kVectors] = {}, i2[kVectors] = {},
+         q2[kVectors] = {};
+  for (int l = 0; l < lanes; ++l) {
+    const ToneStrengthFilter& f = filters[l];
+    phase[l / 4][l % 4] = f.phase_;
+    increment[l / 4][l % 4] = f.phase_increment_;
+    sums[l / 2][2 * (l % 2)] = f.sine_sum_;
+    sums[l / 2][2 * (l % 2) + 1] = f.cosine_sum_;
+    gain[l / 4][l % 4] = f.gain_;
+    i1[l / 4][l % 4] = f.i1_;
+    q1[l / 4][l % 4] = f.q1_;
+    i2[l / 4][l % 4] = f.i2_;
+    q2[l / 4][l % 4] = f.q2_;
+  }
+  const SineCosine* const pairs = GetSineCosineTable();
+  const int32_t decimation = filters[0].decimation_factor_;
+  int32_t countdown = filters[0].countdown_;
+  float* out[4 * kVectors];
+  for (int l = 0; l < 4 * kVectors; ++l) out[l] = outputs[std::min(l, lanes - 1)].data();
+  size_t written = 0;
+  const float* samples = input.data();
+  size_t remaining = input.size();
+  while (remaining > 0) {
+    const int32_t run = static_cast<int32_t>(std::min<size_t>(remaining, countdown));
+    for (int32_t j = 0; j < run; ++j) {
+      const float x = samples[j];
+      const Float4 x4 = {x, x, x, x};
+      UInt4 index[kVectors];
+#pragma GCC unroll 4
+      for (int v = 0; v < kVectors; ++v) {
+        index[v] = phase[v] >> kPhaseShift;
+        phase[v] += increment[v];  // Wraps modulo 2^32: one cycle.
+      }
+#pragma GCC unroll 8
+      for (int p = 0; p < kPairs; ++p) {
+        const UInt4& i = index[p / 2];
+        sums[p] += LoadTwoPairs(pairs, i[2 * (p % 2)], i[2 * (p % 2) + 1]) * x4;
+      }
+    }
+    samples += run;
+    remaining -= run;
+    countdown -= run;
+    if (countdown == 0) {
+      countdown = decimation;
+      // Highest vector and lane first: lanes beyond the last filter write
+      // into the last filter's output before its own lane does.
+      for (int v = kVectors - 1; v >= 0; --v) {
+        const Float4 low = sums[2 * v];
+        const Float4 high = 2 * v + 1 < kPairs ? sums[2 * v + 1] : Float4{};
+        const Float4 in_phase = __builtin_shufflevector(low, high, 1, 3, 5, 7);
+        const Float4 quadrature = __builtin_shufflevector(low, high, 0, 2, 4, 6);
+        i1[v] += (in_phase - i1[v]) * gain[v];
+        q1[v] += (quadrature - q1[v]) * gain[v];
+        i2[v] += (i1[v] - i2[v]) * gain[v];
+        q2[v] += (q1[v] - q2[v]) * gain[v];
+        const Float4 strength = i2[v] * i2[v] + q2[v] * q2[v];
+        for (int l = 3; l >= 0; --l) out[4 * v + l][written] = strength[l];
+      }
+      for (int p = 0; p < kPairs; ++p) sums[p] = Float4{};
+      ++written;
+    }
+  }
+  *produced = written;
+  for (int l = 0; l < lanes; ++l) {
+    ToneStrengthFilter& f = filters[l];
+    f.phase_ = phase[l / 4][l % 4];
+    f.sine_sum_ = sums[l / 2][2 * (l % 2)];
+    f.cosine_sum_ = sums[l / 2][2 * (l % 2) + 1];
+    f.countdown_ = countdown;
+    f.i1_ = i1[l / 4][l % 4];
+    f.q1_ = q1[l / 4][l % 4];
+    f.i2_ = i2[l / 4][l % 4];
+    f.q2_ = q2[l / 4][l % 4];
+  }
 }
 
 void ToneStrengthFilter::Reset() {

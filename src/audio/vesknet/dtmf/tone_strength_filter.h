@@ -16,6 +16,7 @@
 #ifndef AUDIO_VESKNET_DTMF_TONE_STRENGTH_FILTER_H_
 #define AUDIO_VESKNET_DTMF_TONE_STRENGTH_FILTER_H_
 
+#include <cstddef>
 #include <cstdint>
 #include <vector>
 
@@ -37,8 +38,9 @@ class ToneStrengthFilter {
   // Process for each of `count` filters over the same input, writing filter
   // i's strengths to outputs[i]: exactly what calling each one's Process
   // gives. Filters that share their decimation factor and the position in
-  // their group (filters reset together and fed alike) run side by side,
-  // four per vector; others run one after another.
+  // their group (filters reset together and fed alike) run side by side, up
+  // to ten at a time (four on targets with eight vector registers), the sine
+  // and cosine of two filters per vector; others run one after another.
   static void ProcessAll(ToneStrengthFilter* filters, int count, const std::vector<float>& input,
                          std::vector<float>* outputs);
 
@@ -53,6 +55,12 @@ class ToneStrengthFilter {
   float gain() const { return gain_; }
 
  private:
+  // ProcessAll for filters[0 .. lanes) in step, 2 * kPairs - 1 <= lanes <=
+  // 2 * kPairs; sets *produced to the strengths written per filter.
+  template <int kPairs>
+  static void ProcessPairs(ToneStrengthFilter* filters, int lanes, const std::vector<float>& input,
+                           std::vector<float>* outputs, size_t* produced);
+
   // Oscillator.
   const float* sine_table_;
   double sample_rate_;        // Hz.

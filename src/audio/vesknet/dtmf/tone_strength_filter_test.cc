@@ -56,7 +56,7 @@ TEST(ToneStrengthFilterTest, BlockSplitsDoNotMatter) {
 // are not in step (another decimation factor) run one by one.
 TEST(ToneStrengthFilterTest, ProcessAllEqualsEachFiltersProcess) {
   const std::vector<float> input = Tone(1244.53, 3000, 2000);
-  for (int count : {1, 3, 4, 6, 10}) {
+  for (int count : {1, 3, 4, 6, 7, 9, 10, 13}) {
     std::vector<ToneStrengthFilter> bank, alone;
     for (int i = 0; i < count; ++i) {
       const float frequency = 740.0f * (1.0f + 0.13f * i);
@@ -84,24 +84,74 @@ TEST(ToneStrengthFilterTest, ProcessAllEqualsEachFiltersProcess) {
   }
 }
 
+// The low-pass pole for a bandwidth of a quarter of the decimated rate:
+// cos(2 pi / 4) = 0, so b = 1 / (1 - 1 / sqrt 2) = 2 + sqrt 2 and the pole is
+// b - sqrt(b^2 - 1) = 0.14973; its group delay 2p / (1 - p) rounds to 0.
+double QuarterRateGain() {
+  const double b = 2.0 + std::sqrt(2.0);
+  return 1.0 - (b - std::sqrt(b * b - 1.0));
+}
+
+TEST(ToneStrengthFilterTest, LowPassDesign) {
+  const ToneStrengthFilter quarter(8000, 0, 2000, 1);
+  EXPECT_NEAR(quarter.gain(), QuarterRateGain(), 1e-7);
+  EXPECT_NEAR(quarter.gain(), 0.8502702, 1e-7);
+  EXPECT_EQ(quarter.delay(), 0);
+  // The decoder's: 11.864 Hz at 44100 / 16 Hz gives the pole 0.958853, a
+  // gain of 0.041147 and a delay of round(46.61) = 47 decimated samples.
+  const ToneStrengthFilter decoder(44100, 740, 11.863858f, 16);
+  EXPECT_NEAR(decoder.gain(), 0.0411470, 2e-7);
+  EXPECT_EQ(decoder.delay(), 47);
+}
+
 // Frequency 0: the cosine arm passes the input, the sine arm gives 0, so with
 // decimation 1 each strength is the input after two low-pass stages, squared.
 TEST(ToneStrengthFilterTest, DecimationOneAtFrequencyZero) {
-  ToneStrengthFilter filter(8000, 0, 100, 1);
+  ToneStrengthFilter filter(8000, 0, 2000, 1);
   std::vector<float> strengths;
   filter.Process({2, 2, 2, -1}, &strengths);
   ASSERT_EQ(strengths.size(), 4u);
-  const float k = filter.gain();
-  float i1 = 0, i2 = 0;
+  const double k = QuarterRateGain();
+  double i1 = 0, i2 = 0;
   for (size_t n = 0; n < 4; ++n) {
-    i1 += ((n < 3 ? 2.0f : -1.0f) - i1) * k;
+    i1 += ((n < 3 ? 2.0 : -1.0) - i1) * k;
     i2 += (i1 - i2) * k;
-    EXPECT_FLOAT_EQ(strengths[n], i2 * i2) << n;
+    EXPECT_NEAR(strengths[n], i2 * i2, 1e-5) << n;
   }
   // Reset clears the low-pass: silence then reads zero.
   filter.Reset();
   filter.Process({0, 0}, &strengths);
   EXPECT_EQ(strengths, (std::vector<float>{0, 0}));
+}
+
+// Reset also restarts the group: after 3 of 4 samples, a Reset and 4 more
+// give one strength of the 4 new samples only, (4 k^2)^2 from rest.
+TEST(ToneStrengthFilterTest, ResetRestartsTheGroup) {
+  ToneStrengthFilter filter(8000, 0, 500, 4);  // A quarter of the decimated 2000 Hz.
+  std::vector<float> strengths;
+  filter.Process({5, 5, 5}, &strengths);
+  EXPECT_TRUE(strengths.empty());
+  filter.Reset();
+  filter.Process({1, 1, 1, 1}, &strengths);
+  const double k = QuarterRateGain();
+  ASSERT_EQ(strengths.size(), 1u);
+  EXPECT_NEAR(strengths[0], std::pow(4 * k * k, 2), 1e-4);
+}
+
+// The oscillator starts half a table step in, so truncating the phase picks
+// the nearest entry. At 1 Hz of 8192 Hz the phase advances half a step per
+// sample: indices 0, 1, 1, 2, ... (from a phase of 0 they would be 0, 0, 1,
+// 1, ...). The input +1, -1 over the first two samples then leaves I = 1 -
+// cos(2 pi / 4096) and Q = -sin(2 pi / 4096): |I + jQ|^2 = 4 sin^2(pi / 4096)
+// (0 from a phase of 0), times k^4 through the two low-pass stages.
+TEST(ToneStrengthFilterTest, OscillatorStartsHalfAStepIn) {
+  ToneStrengthFilter filter(8192, 1, 1024, 2);  // Decimated rate 4096 Hz.
+  std::vector<float> strengths;
+  filter.Process({1, -1}, &strengths);
+  ASSERT_EQ(strengths.size(), 1u);
+  const double k = QuarterRateGain();
+  const double expected = std::pow(k, 4) * 4 * std::pow(std::sin(M_PI / 4096), 2);
+  EXPECT_NEAR(strengths[0], expected, 1e-3 * expected);
 }
 
 TEST(ToneStrengthFilterDeathTest, Preconditions) {
