@@ -8,14 +8,15 @@
 // was sent to that decoder; the heap and the resident set are watched.
 //
 //   soak [--hours H] [--seed N] [--min-snr DB] [--max-snr DB] [--hostile]
-//        [--record FILE --record-from S --record-seconds S]
+//        [--record FILE [--record-from S] [--record-seconds N]]
+//
+// --hostile sends no token and adds music (chords of harmonic tones) to the
+// background sounds: every reported token is false.
 //
 // --record writes the microphone stream from stream time --record-from on,
 // for --record-seconds, as headerless 16-bit little-endian PCM (48 kHz
 // mono), so that a false token can be decoded again alone, e.g. with
 // `vesk decode --raw --rate 48000 --channels 1`.
-// --hostile sends no token and adds music (chords of harmonic tones) to the
-// background sounds: every reported token is false.
 //
 // The output ends with one line:
 //   RESULT hours=H decoders=4 tokens_sent=N tokens_decoded=D false_tokens=F
