@@ -76,7 +76,8 @@ Channels Transmit(const std::vector<float>& source, const Path& path, int64_t fr
                   uint64_t room_stream, const ChannelParams& params) {
   std::vector<float> played = source;
   if (params.overdrive_db > 0.0) ClipPlayback(params.overdrive_db, &played);
-  const float gain = static_cast<float>(32768.0 * std::pow(10.0, params.level_db / 20.0));
+  const float gain =
+      static_cast<float>(32768.0 * params.gain * std::pow(10.0, params.level_db / 20.0));
   const SincResampler resampler(path.step);
   std::vector<float> dry(static_cast<size_t>(frames));
   if (path.walk == nullptr) {
@@ -163,6 +164,7 @@ void CheckParams(const ChannelParams& params) {
   CHECK(params.channels == 1 || params.channels == 2);
   CHECK(params.speed > 0.0);
   CHECK(std::isfinite(params.level_db));
+  CHECK(params.gain >= 0.0 && std::isfinite(params.gain));
   CHECK(params.snr_db > -INFINITY);
   CHECK(params.rt60_s > 0.0);
   CHECK(params.lead_in_s >= 0.0);

@@ -59,6 +59,7 @@
 #include "tools/channel/dropouts.h"
 #include "tools/channel/impulses.h"
 #include "tools/channel/music.h"
+#include "tools/channel/noise.h"
 #include "tools/channel/random.h"
 
 namespace vesk_channel {
@@ -73,6 +74,9 @@ struct ChannelParams {
   // 20) (the direct path's level; reverberation adds its own energy on top).
   // Low levels leave the signal a few steps of the 16-bit quantiser.
   double level_db = 0.0;
+  // >= 0, finite: a linear factor on top of level_db, for programs that
+  // think in amplitude (full scale becomes 32768 x gain x 10^(level_db / 20)).
+  double gain = 1.0;
   // Full-band signal-to-noise ratio in dB; +infinity: no noise.
   double snr_db = INFINITY;
   bool reverb = false;

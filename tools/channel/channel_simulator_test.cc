@@ -140,6 +140,12 @@ TEST(PlayThroughChannelTest, ClipsToSixteenBits) {
   const ChannelOutput out = PlayThroughChannel(Tone(440, 44100, 0.2), 44100, p);
   EXPECT_GT(std::count(out.samples.begin(), out.samples.end(), 32767), 1000);
   EXPECT_GT(std::count(out.samples.begin(), out.samples.end(), -32768), 1000);
+  // A linear gain of 3 is the same level.
+  ChannelParams linear;
+  linear.gain = 3.0;
+  const ChannelOutput same = PlayThroughChannel(Tone(440, 44100, 0.2), 44100, linear);
+  ASSERT_EQ(same.samples.size(), out.samples.size());
+  for (size_t i = 0; i < out.samples.size(); ++i) EXPECT_NEAR(same.samples[i], out.samples[i], 1);
 }
 
 TEST(PlayThroughChannelTest, LevelSetsTheScaleDownToAFewQuantiserSteps) {
