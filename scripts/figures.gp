@@ -80,3 +80,46 @@ plot \
   cells("dtmf", 1, "speed", "product") using @percent with linespoints lc rgb dtmf pt 9 ps 0.6 lw 2 dt 2 title "DTMF, x1", \
   cells("zintar", 3, "speed", "48k/16/4") using @percent with linespoints lc rgb zintar pt 11 ps 0.5 lw 2 title "wake-ups, 48k coder, x3", \
   cells("zintar", 1, "speed", "48k/16/4") using @percent with linespoints lc rgb zintar pt 11 ps 0.5 lw 2 dt 2 title "wake-ups, 48k coder, x1"
+
+# The impairment tables: one plot each, every modem with the token played
+# once (dashed) and three times; for a second transmitter the other token's
+# success too (dotted).
+impairments = "phone flagship clip agc level dropout dropout_length walk tone tone_fixed tones2 music impulses second second_offset"
+title_of(t) = \
+  t eq "phone" ? "Budget phone loudspeaker and microphone" : \
+  t eq "flagship" ? "Flagship phone loudspeaker and microphone" : \
+  t eq "clip" ? "Playback clipped (overdrive), 10 dB SNR" : \
+  t eq "agc" ? "Recording AGC, one gain step a second, 0 dB SNR" : \
+  t eq "level" ? "Recording level without noise (16-bit quantisation)" : \
+  t eq "dropout" ? "20 ms recording dropouts, 0 dB SNR" : \
+  t eq "dropout_length" ? "Recording dropouts once a second, 0 dB SNR" : \
+  t eq "walk" ? "Listener walking past (closest 0.5 m), 0 dB SNR" : \
+  t eq "tone" ? "One steady tone anywhere in the band, 10 dB SNR" : \
+  t eq "tone_fixed" ? "One tone at DSSS carrier + 100 Hz / DTMF 1200 Hz, 10 dB SNR" : \
+  t eq "tones2" ? "Two steady tones anywhere in the band, 10 dB SNR" : \
+  t eq "music" ? "Music (chords, 32 partials a note), 10 dB SNR" : \
+  t eq "impulses" ? "Claps and door slams, two a second, 10 dB SNR" : \
+  t eq "second" ? "A second transmitter 0.1 s later, 10 dB SNR" : \
+  t eq "second_offset" ? "A second transmitter of equal power, 10 dB SNR" : t
+impairment(t, modem, repeat, series) = \
+  sprintf("< awk -F, '$4==\"%s\"' %s/impairments/%s_%s_x%d.csv", series, dir, t, modem, repeat)
+set xtics auto format "% g"
+set ylabel "tokens decoded, %"
+do for [t in impairments] {
+  file = sprintf("%s/impairments/%s_dsss_x3.csv", dir, t)
+  if (system(sprintf("test -s %s && echo 1 || echo 0", file)) == 1) {
+    set output sprintf("%s/impairments/%s%s", dir, t, ext)
+    set title sprintf("%s (%d seeds)", title_of(t), seeds)
+    set xlabel system(sprintf("awk -F, 'NR==2 {print $2}' %s", file))
+    two = (t eq "second" || t eq "second_offset")
+    plot \
+      impairment(t, "dsss", 3, "48k/16/4") using @percent with linespoints lc rgb dsss48 pt 7 ps 0.5 lw 2 title "DSSS 48k coder, x3", \
+      impairment(t, "dsss", 1, "48k/16/4") using @percent with linespoints lc rgb dsss48 pt 7 ps 0.5 lw 2 dt 2 title "DSSS 48k coder, x1", \
+      impairment(t, "dsss", 3, "44.1k/15/3") using @percent with linespoints lc rgb dsss44 pt 5 ps 0.5 lw 2 title "DSSS 44.1k coder, x3", \
+      impairment(t, "dsss", 1, "44.1k/15/3") using @percent with linespoints lc rgb dsss44 pt 5 ps 0.5 lw 2 dt 2 title "DSSS 44.1k coder, x1", \
+      impairment(t, "dtmf", 3, "product") using @percent with linespoints lc rgb dtmf pt 9 ps 0.6 lw 2 title "DTMF, x3", \
+      impairment(t, "dtmf", 1, "product") using @percent with linespoints lc rgb dtmf pt 9 ps 0.6 lw 2 dt 2 title "DTMF, x1", \
+      (two ? impairment(t, "dsss", 3, "48k/16/4 other") : "< true") using @percent with linespoints lc rgb dsss48 pt 6 ps 0.5 lw 1 dt 3 title (two ? "other token: DSSS 48k, x3" : ""), \
+      (two ? impairment(t, "dtmf", 3, "product other") : "< true") using @percent with linespoints lc rgb dtmf pt 8 ps 0.5 lw 1 dt 3 title (two ? "other token: DTMF, x3" : "")
+  }
+}

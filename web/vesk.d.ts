@@ -71,6 +71,8 @@ export interface DecoderOptions {
   poll_interval_seconds: number; // Stream time between requests, (0, 1] (0.25).
   /** A token is reported again only after it went unheard this long, seconds; 0: every time (3). */
   hold_seconds: number;
+  /** Notch steady tones in the modem's band out of the input; not in the listening mode (1). */
+  narrowband_excision: number | boolean;
 }
 
 export interface DecoderOptionsInput extends Partial<DecoderOptions> {

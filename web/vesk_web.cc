@@ -102,6 +102,7 @@ std::string Layout() {
   VESK_WEB_FIELD(&json, vesk_decoder_options, design_baseband_filter);
   VESK_WEB_FIELD(&json, vesk_decoder_options, poll_interval_seconds);
   VESK_WEB_FIELD(&json, vesk_decoder_options, hold_seconds);
+  VESK_WEB_FIELD(&json, vesk_decoder_options, narrowband_excision);
   EndRecord(&json);
   BeginRecord(&json, "pcm", sizeof(vesk_pcm));
   VESK_WEB_FIELD(&json, vesk_pcm, samples);

@@ -158,6 +158,7 @@ std::unique_ptr<audio_modem::AudioModemEncoder> MakeEncoder(const vesk_config& c
 std::string OptionsError(const vesk_decoder_options& options, int modem) {
   if (!IsFlag(options.listening_mode)) return "listening_mode must be 0 or 1";
   if (!IsFlag(options.design_baseband_filter)) return "design_baseband_filter must be 0 or 1";
+  if (!IsFlag(options.narrowband_excision)) return "narrowband_excision must be 0 or 1";
   if (options.listening_mode && modem != VESK_MODEM_DSSS) {
     return "the listening mode hears DSSS transmitters only";
   }
@@ -186,6 +187,7 @@ std::unique_ptr<audio_modem::TokenStream> MakeStream(const vesk_config& config,
     dsss.num_channels = options.channels;
     dsss.buffer_length_tokens = options.buffer_length_tokens;
     dsss.use_zintar = options.listening_mode != 0;
+    dsss.narrowband_excision = options.narrowband_excision != 0;
     return audio_modem::TokenStream::Create(dsss, config.crc_check_bytes, stream_options, error);
   }
   audio_modem::DtmfDecoderConfig dtmf;
@@ -194,6 +196,7 @@ std::unique_ptr<audio_modem::TokenStream> MakeStream(const vesk_config& config,
   dtmf.input_sample_rate = static_cast<float>(options.microphone_rate_hz);
   dtmf.num_channels = options.channels;
   dtmf.buffer_length_tokens = options.buffer_length_tokens;
+  dtmf.narrowband_excision = options.narrowband_excision != 0;
   return audio_modem::TokenStream::Create(dtmf, config.crc_check_bytes, stream_options, error);
 }
 
@@ -349,6 +352,7 @@ vesk_status vesk_decoder_options_defaults(vesk_decoder_options* options) {
   options->design_baseband_filter = dsss.design_baseband_filter;
   options->poll_interval_seconds = stream.poll_interval_seconds;
   options->hold_seconds = stream.hold_seconds;
+  options->narrowband_excision = dsss.narrowband_excision;
   return Ok();
 }
 

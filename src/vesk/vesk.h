@@ -174,6 +174,10 @@ typedef struct vesk_decoder_options {
   /* A token is reported again only after it went unheard for this long,
      seconds, >= 0; 0 reports it at every request that decodes it (3). */
   double hold_seconds;
+  /* Notch steady tones (other devices' pilots, whine) out of the input in
+     the modem's band before decoding; not in the listening mode. 0 or 1
+     (1): with no such tone it changes nothing and costs a few percent. */
+  int narrowband_excision;
 } vesk_decoder_options;
 
 VESK_API vesk_status vesk_decoder_options_defaults(vesk_decoder_options* options);

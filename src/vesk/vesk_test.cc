@@ -72,6 +72,7 @@ TEST(VeskCTest, DefaultsAreTheProductConfigurations) {
   EXPECT_EQ(options.max_tokens_per_call, 2);
   EXPECT_EQ(options.poll_interval_seconds, 0.25);
   EXPECT_EQ(options.hold_seconds, 3.0);
+  EXPECT_EQ(options.narrowband_excision, 1);
   EXPECT_STREQ(vesk_version(), VESK_VERSION_STRING);
 }
 
@@ -100,6 +101,35 @@ TEST(VeskCTest, DefaultsRoundTrip) {
     const std::vector<Heard> heard = Decode(config, options, Broadcast(config, message), 4096);
     ASSERT_EQ(heard.size(), 1u) << c.name;
     EXPECT_EQ(heard[0].message, message) << c.name;
+  }
+}
+
+// A steady tone 20 dB over the token in the modem's band (DSSS: 19 kHz;
+// DTMF: 1200 Hz, 44.5 Hz below one of its tones): heard through the excision
+// stage, not without it.
+TEST(VeskCTest, NarrowbandExcisionHearsThroughASteadyToneAndCanBeTurnedOff) {
+  for (const vesk_modem modem : {VESK_MODEM_DSSS, VESK_MODEM_DTMF}) {
+    vesk_config config = Defaults(modem);
+    config.dsss.broadcast_sample_rate_hz = 44100;
+    const std::vector<uint8_t>& message = modem == VESK_MODEM_DSSS ? kSix : kFive;
+    std::vector<int16_t> pcm = Broadcast(config, message);
+    double power = 0;
+    for (int16_t s : pcm) power += static_cast<double>(s) * s;
+    const double rms = std::sqrt(power / pcm.size());
+    const double hz = modem == VESK_MODEM_DSSS ? 19000 : 1200;
+    for (size_t i = 0; i < pcm.size(); ++i) {
+      const double tone = 10 * std::sqrt(2.0) * rms * std::sin(2 * M_PI * hz * i / 44100);
+      pcm[i] = static_cast<int16_t>(std::lround(0.08 * (pcm[i] + tone)));
+    }
+    for (const int excision : {1, 0}) {
+      vesk_decoder_options options = Options(44100);
+      options.narrowband_excision = excision;
+      const std::vector<Heard> heard = Decode(config, options, pcm, 4096);
+      EXPECT_EQ(heard.size(), excision ? 1u : 0u) << modem << " " << excision;
+      if (excision && !heard.empty()) {
+        EXPECT_EQ(heard[0].message, message) << modem;
+      }
+    }
   }
 }
 
@@ -316,6 +346,7 @@ TEST(VeskCTest, RefusedConfigurationsSayWhy) {
       {VESK_MODEM_DSSS, [](auto*, auto* o) { o->listening_mode = 2; }, "listening_mode"},
       {VESK_MODEM_DSSS, [](auto*, auto* o) { o->poll_interval_seconds = 0; }, "poll interval"},
       {VESK_MODEM_DSSS, [](auto*, auto* o) { o->hold_seconds = -1; }, "hold"},
+      {VESK_MODEM_DTMF, [](auto*, auto* o) { o->narrowband_excision = 2; }, "narrowband_excision"},
   };
   for (const Case& c : cases) {
     vesk_config config = Defaults(c.modem);

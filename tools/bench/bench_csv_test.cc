@@ -75,6 +75,17 @@ TEST(BenchCsvTest, DtmfRobustness) {
             (std::vector<std::string>{"snr/product", "reverb/product"}));
 }
 
+// Impairment tables at a mild point: tones and music 10 dB under the signal.
+TEST(BenchCsvTest, ImpairmentTables) {
+  EXPECT_EQ(CheckCsv(DSSS_ROBUSTNESS,
+                     {"--coder", "48k", "--tables", "tone,tones2,music", "--values", "10"}),
+            (std::vector<std::string>{"tone/48k/16/4", "tones2/48k/16/4", "music/48k/16/4"}));
+  EXPECT_EQ(
+      CheckCsv(DTMF_ROBUSTNESS,
+               {"--windows", "product", "--tables", "tone,tones2,music", "--values", "10"}, "2"),
+      (std::vector<std::string>{"tone/product", "tones2/product", "music/product"}));
+}
+
 TEST(BenchCsvTest, ZintarRobustness) {
   EXPECT_EQ(CheckCsv(ZINTAR_ROBUSTNESS, {"--tables", "detect,speed"}),
             (std::vector<std::string>{"detect/48k/16/4", "detect/44.1k/15/3", "speed/48k/16/4",

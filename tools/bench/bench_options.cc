@@ -49,14 +49,22 @@ bool ParseValueList(const std::string& text, std::vector<double>* values) {
 
 int ParseBenchArguments(int argc, char** argv, const std::string& description,
                         vesk_tool::OptionParser* parser, BenchOptions* options) {
-  std::string snrs, speeds;
+  std::string snrs, speeds, values;
   parser->AddInt("seeds", &options->seeds, "seeds per table cell").Range(1, 100000);
+  parser
+      ->AddInt("first-seed", &options->first_seed,
+               "seed of a cell's first trial (the published tables use 1; develop on others)")
+      .Range(1, 1000000000);
   parser->AddInt("threads", &options->threads, "trials run at once").Range(1, 256);
   parser->AddString("csv", &options->csv, "also write every table cell to this CSV file")
       .Placeholder("FILE");
   parser->AddString("snrs", &snrs, "SNR values of the SNR tables, dB (default: each table's)")
       .Placeholder("LIST");
   parser->AddString("speeds", &speeds, "values of the speed tables (default: each table's)")
+      .Placeholder("LIST");
+  parser
+      ->AddString("values", &values,
+                  "values of the impairment tables' variable (default: each table's)")
       .Placeholder("LIST");
   vesk_tool::AddOverTheAirOptions(parser, &options->air);
   std::string error;
@@ -74,6 +82,10 @@ int ParseBenchArguments(int argc, char** argv, const std::string& description,
   if (error.empty() && !speeds.empty() && !ParseValueList(speeds, &options->speeds)) {
     error = "--speeds " + speeds + ": needs numbers or FROM:TO:STEP ranges, comma-separated";
   }
+  if (error.empty() && !values.empty() && !ParseValueList(values, &options->values)) {
+    error = "--values " + values + ": needs numbers or FROM:TO:STEP ranges, comma-separated";
+  }
+  if (error.empty()) error = vesk_tool::OverTheAirError(options->air);
   for (const double speed : options->speeds) {
     if (error.empty() && !(speed >= 0.5 && speed <= 2.0)) {
       error = "--speeds " + speeds + ": every speed must lie in 0.5 to 2";

@@ -15,18 +15,21 @@
 namespace vesk_bench {
 
 struct BenchOptions {
-  int seeds = 20;              // Trials per table cell, seeds 1 ... seeds.
+  int seeds = 20;              // Trials per table cell, seeds first_seed ... + seeds - 1.
+  int first_seed = 1;          // The published tables use 1; development runs others.
   int threads = 1;             // Trials run at once.
   std::string csv;             // Path of the CSV of every table cell, or empty.
   std::vector<double> snrs;    // SNR values of the SNR tables, dB; empty: each table's own.
   std::vector<double> speeds;  // Values of the speed tables; empty: each table's own.
+  std::vector<double> values;  // Of the impairment tables' variable; empty: each table's own.
   vesk_tool::OverTheAir air;   // The room and the repetitions of every trial.
 };
 
-// Registers the options above (the lists as --snrs and --speeds: numbers or
-// FROM:TO:STEP ranges, comma-separated) with `options`' values as defaults,
-// parses `argc`/`argv`, and prints the help or an error. Returns -1 to go
-// on, or the exit status (0 after the help, 2 after an error).
+// Registers the options above (the lists as --snrs, --speeds and --values:
+// numbers or FROM:TO:STEP ranges, comma-separated) with `options`' values as
+// defaults, parses `argc`/`argv` (checking the over-the-air options together,
+// vesk_tool::OverTheAirError), and prints the help or an error. Returns -1 to
+// go on, or the exit status (0 after the help, 2 after an error).
 int ParseBenchArguments(int argc, char** argv, const std::string& description,
                         vesk_tool::OptionParser* parser, BenchOptions* options);
 

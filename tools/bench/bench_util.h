@@ -17,15 +17,19 @@
 
 namespace vesk_bench {
 
-// fn(seed) for seeds 1 .. num_seeds on `threads` threads, results in seed order.
+// fn(seed) for seeds first_seed .. first_seed + num_seeds - 1 on `threads`
+// threads, results in seed order.
 template <typename Fn>
-auto ForSeeds(int num_seeds, int threads, Fn fn) -> std::vector<decltype(fn(uint64_t{1}))> {
+auto ForSeeds(int num_seeds, int threads, int first_seed, Fn fn)
+    -> std::vector<decltype(fn(uint64_t{1}))> {
   std::vector<decltype(fn(uint64_t{1}))> results(num_seeds);
   std::atomic<int> next{0};
   std::vector<std::thread> workers;
   for (int t = 0; t < threads; ++t) {
     workers.emplace_back([&] {
-      for (int i; (i = next++) < num_seeds;) results[i] = fn(static_cast<uint64_t>(i + 1));
+      for (int i; (i = next++) < num_seeds;) {
+        results[i] = fn(static_cast<uint64_t>(first_seed) + static_cast<uint64_t>(i));
+      }
     });
   }
   for (std::thread& worker : workers) worker.join();
@@ -35,6 +39,7 @@ auto ForSeeds(int num_seeds, int threads, Fn fn) -> std::vector<decltype(fn(uint
 // The trials of one table cell.
 struct Point {
   int successes = 0;
+  int second_successes = 0;  // The second transmitter's token heard.
   int wrong = 0;
   std::vector<double> delays;  // Of the successes.
 };
@@ -43,6 +48,7 @@ inline Point Summarize(const std::vector<TrialResult>& results) {
   Point point;
   for (const TrialResult& r : results) {
     point.successes += r.correct;
+    point.second_successes += r.second_correct;
     point.wrong += r.wrong;
     if (r.correct) point.delays.push_back(r.found_delay_s);
   }

@@ -5,8 +5,10 @@
 // babble. Both coder configurations in use are measured.
 //
 //   dsss_robustness [--seeds N] [--threads N] [--coder 44k|48k|both]
-//       [--tables snr,speed,reverb,mic48,unchecked,false,tune,host]
+//       [--tables snr,speed,reverb,mic48,unchecked,false,tune,host,
+//                 impairments or any of them (see impairment_tables.h)]
 //       [--set name=value,...] [--csv FILE] [--snrs LIST] [--speeds LIST]
+//       [--values LIST] [--first-seed N]
 //       [room options: --repeat, --snr, --speed, --reverb, --mic-rate, ...]
 //
 // (--help lists every option.) The room options set the channel of every
@@ -26,6 +28,7 @@
 #include "tools/bench/bench_options.h"
 #include "tools/bench/bench_util.h"
 #include "tools/bench/dsss_trial.h"
+#include "tools/bench/impairment_tables.h"
 #include "tools/bench/sweep_table.h"
 
 namespace vesk_bench {
@@ -38,10 +41,11 @@ struct Options {
   double false_minutes = 10.0;
   std::string label = "defaults";  // Row label of the tune table.
   audio_vesknet::VesknetDecoderParams tuning;
+  ExcisionTuning excision;
 };
 
 Point RunPoint(const DsssTrial& trial, const Options& options) {
-  return Summarize(ForSeeds(options.bench.seeds, options.bench.threads,
+  return Summarize(ForSeeds(options.bench.seeds, options.bench.threads, options.bench.first_seed,
                             [&](uint64_t seed) { return RunDsssTrial(trial, seed); }));
 }
 
@@ -50,6 +54,7 @@ DsssTrial BaseTrial(const Options& options, const audio_modem::DsssWaveformConfi
   DsssTrial trial;
   trial.waveform = waveform;
   trial.tuning = options.tuning;
+  trial.excision = options.excision;
   trial.channel = options.bench.air.channel;
   trial.repeat = options.bench.air.repeat;
   return trial;
@@ -84,6 +89,28 @@ void Sweep(const char* table, const char* title, const char* variable,
       [&](double value, size_t series) {
         DsssTrial trial = BaseTrial(options, coders[series].waveform);
         setup(value, &trial);
+        return RunPoint(trial, options);
+      },
+      csv);
+}
+
+// The DSSS band of a coder: the carrier plus and minus the chip rate (the
+// spread spectrum's main lobe).
+ModemBand Band(const audio_modem::DsssWaveformConfig& waveform) {
+  const double chip_rate = waveform.sample_rate / waveform.upsampling_factor;
+  return {waveform.carrier_frequency - chip_rate, waveform.carrier_frequency + chip_rate,
+          waveform.carrier_frequency + 100.0};
+}
+
+void ImpairmentSweep(const ImpairmentTable& table, const Options& options, CsvFile* csv) {
+  const std::vector<Coder> coders = Coders(options);
+  std::vector<std::string> names;
+  for (const Coder& c : coders) names.push_back(c.name);
+  RunImpairmentTable(
+      table, options.bench.values, names, options.bench.seeds, options.bench.air.repeat,
+      [&](double value, size_t series) {
+        DsssTrial trial = BaseTrial(options, coders[series].waveform);
+        table.set(value, Band(coders[series].waveform), &trial.channel);
         return RunPoint(trial, options);
       },
       csv);
@@ -240,7 +267,9 @@ int main(int argc, char** argv) {
   float false_minutes = static_cast<float>(options.false_minutes);
   std::string tuning;
   vesk_tool::OptionParser parser;
-  parser.AddString("tables", &options.tables, "snr,speed,reverb,mic48,unchecked,false,tune,host");
+  parser.AddString("tables", &options.tables,
+                   "snr,speed,reverb,mic48,unchecked,false,tune,host; impairments (all of): " +
+                       vesk_bench::ImpairmentTableNames());
   parser.AddString("coder", &options.coder, "the coders measured").Choices({"44k", "48k", "both"});
   parser.AddFloat("false-minutes", &false_minutes, "minutes of noise and of babble")
       .Range(0.1, 1000);
@@ -251,7 +280,7 @@ int main(int argc, char** argv) {
   if (status >= 0) return status;
   options.false_minutes = false_minutes;
   if (!vesk_bench::ApplyAssignments(tuning, [&](const std::string& assignment) {
-        return vesk_bench::SetTuning(assignment, &options.tuning);
+        return vesk_bench::SetTuning(assignment, &options.tuning, &options.excision);
       })) {
     return 2;
   }
@@ -319,5 +348,11 @@ int main(int argc, char** argv) {
   if (vesk_bench::HasItem(options.tables, "false")) vesk_bench::FalseTokens(options);
   if (vesk_bench::HasItem(options.tables, "tune")) vesk_bench::TuneRow(options, options.label);
   if (vesk_bench::HasItem(options.tables, "host")) vesk_bench::HostTables(options);
+  for (const vesk_bench::ImpairmentTable& table : vesk_bench::ImpairmentTables()) {
+    if (vesk_bench::HasItem(options.tables, table.name.c_str()) ||
+        vesk_bench::HasItem(options.tables, "impairments")) {
+      vesk_bench::ImpairmentSweep(table, options, &csv);
+    }
+  }
   return 0;
 }

@@ -20,7 +20,11 @@ std::unique_ptr<audio_modem::AudioModemDecoder> MakeDecoder(const DsssTrial& tri
   config.acquisition_window_seconds = trial.tuning.acquisition_window_duration;
   config.broadcaster_threshold = trial.tuning.broadcaster_threshold;
   config.buffer_length_tokens = trial.buffer_length_tokens;
-  return audio_modem::MakeDsssAudioModemDecoder(config, trial.tuning);
+  config.narrowband_excision = false;
+  auto decoder = audio_modem::MakeDsssAudioModemDecoder(config, trial.tuning);
+  AddExcision(trial.excision, audio_modem::DsssExcisionParams(trial.waveform), rate, channels,
+              decoder.get());
+  return decoder;
 }
 
 vesk_tool::StreamDecodingOptions StreamOptions(const DsssTrial& trial) {
@@ -56,6 +60,11 @@ int CountFalseTokens(const DsssTrial& trial, double seconds, bool babble, uint64
   const auto decoder = MakeDecoder(trial, rate, 1);
   return CountFalseTokens(decoder.get(), rate, trial.crc ? 6 : 8, trial.crc ? 2 : 0, seconds,
                           babble, seed, StreamOptions(trial), detections);
+}
+
+bool SetTuning(const std::string& assignment, audio_vesknet::VesknetDecoderParams* tuning,
+               ExcisionTuning* excision) {
+  return SetExcisionTuning(assignment, excision) || SetTuning(assignment, tuning);
 }
 
 bool SetTuning(const std::string& assignment, audio_vesknet::VesknetDecoderParams* t) {

@@ -22,6 +22,7 @@ struct DsssTrial {
   bool zintar = false;                // Listen through the zintar mode.
   int chunk_bytes = 4096;             // PCM bytes per decoder call.
   float buffer_length_tokens = 4.0f;  // Decoder history, in token durations.
+  ExcisionTuning excision;            // The stage in front of the decoder.
 };
 
 TrialResult RunDsssTrial(const DsssTrial& trial, uint64_t seed);
@@ -32,6 +33,10 @@ int CountFalseTokens(const DsssTrial& trial, double seconds, bool babble, uint64
 
 // Applies "name=value" to the tuning; false for an unknown name or bad value.
 bool SetTuning(const std::string& assignment, audio_vesknet::VesknetDecoderParams* tuning);
+// The same for the decoder tuning (above) and the excision stage
+// (SetExcisionTuning).
+bool SetTuning(const std::string& assignment, audio_vesknet::VesknetDecoderParams* tuning,
+               ExcisionTuning* excision);
 
 }  // namespace vesk_bench
 

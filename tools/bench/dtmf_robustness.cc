@@ -7,9 +7,11 @@
 // and the 10/10/20/10 ms ADSR with a half-level sustain.
 //
 //   dtmf_robustness [--seeds N] [--threads N] [--false-minutes M]
-//                   [--tables snr,speed,reverb,babble,mic48,stereo,false]
+//                   [--tables snr,speed,reverb,babble,mic48,stereo,false,
+//                             impairments or any of them (impairment_tables.h)]
 //                   [--windows product,halfsine,adsr] [--set name=value,...]
-//                   [--csv FILE] [--snrs LIST] [--speeds LIST]
+//                   [--csv FILE] [--snrs LIST] [--speeds LIST] [--values LIST]
+//                   [--first-seed N]
 //                   [room options: --repeat, --snr, --speed, --reverb, ...]
 //
 // (--help lists every option.) The room options set the channel of every
@@ -31,6 +33,7 @@
 #include "tools/bench/bench_options.h"
 #include "tools/bench/bench_util.h"
 #include "tools/bench/dtmf_trial.h"
+#include "tools/bench/impairment_tables.h"
 #include "tools/bench/sweep_table.h"
 
 namespace vesk_bench {
@@ -45,7 +48,7 @@ struct Options {
 };
 
 Point RunPoint(const DtmfTrial& trial, const Options& options) {
-  return Summarize(ForSeeds(options.bench.seeds, options.bench.threads,
+  return Summarize(ForSeeds(options.bench.seeds, options.bench.threads, options.bench.first_seed,
                             [&](uint64_t seed) { return RunDtmfTrial(trial, seed); }));
 }
 
@@ -94,6 +97,30 @@ void Sweep(const char* table, const std::string& title, const char* variable,
       csv);
 }
 
+// The band of the DTMF tone set.
+ModemBand Band(const DtmfTrial& trial) {
+  const std::vector<float> tones = trial.config.tone_frequencies.empty()
+                                       ? audio_vesknet::DtmfEncoderParams().tone_frequencies
+                                       : trial.config.tone_frequencies;
+  return {*std::min_element(tones.begin(), tones.end()),
+          *std::max_element(tones.begin(), tones.end()), 1200.0};
+}
+
+void ImpairmentSweep(const ImpairmentTable& table, const Options& options, CsvFile* csv) {
+  const std::vector<Window> windows = Windows(options);
+  std::vector<std::string> names;
+  for (const Window& w : windows) names.push_back(w.name);
+  RunImpairmentTable(
+      table, options.bench.values, names, options.bench.seeds, options.bench.air.repeat,
+      [&](double value, size_t series) {
+        DtmfTrial trial = BaseTrial(options);
+        trial.window = windows[series].window;
+        table.set(value, Band(trial), &trial.channel);
+        return RunPoint(trial, options);
+      },
+      csv);
+}
+
 void FalseTokens(const Options& options) {
   std::printf("\n### False tokens in %g minutes without a transmitter (5 raw bytes)\n\n",
               options.false_minutes);
@@ -123,7 +150,9 @@ int main(int argc, char** argv) {
   float false_minutes = static_cast<float>(options.false_minutes);
   std::string tuning;
   vesk_tool::OptionParser parser;
-  parser.AddString("tables", &options.tables, "snr,speed,reverb,babble,mic48,stereo,false");
+  parser.AddString("tables", &options.tables,
+                   "snr,speed,reverb,babble,mic48,stereo,false; impairments (all of): " +
+                       vesk_bench::ImpairmentTableNames());
   parser.AddString("windows", &options.windows, "product,halfsine,adsr");
   parser.AddFloat("false-minutes", &false_minutes, "minutes of noise and of babble")
       .Range(0.1, 1000);
@@ -201,5 +230,11 @@ int main(int argc, char** argv) {
         });
   }
   if (vesk_bench::HasItem(tables, "false")) vesk_bench::FalseTokens(options);
+  for (const vesk_bench::ImpairmentTable& table : vesk_bench::ImpairmentTables()) {
+    if (vesk_bench::HasItem(tables, table.name.c_str()) ||
+        vesk_bench::HasItem(tables, "impairments")) {
+      vesk_bench::ImpairmentSweep(table, options, &csv);
+    }
+  }
   return 0;
 }

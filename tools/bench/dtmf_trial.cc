@@ -36,7 +36,14 @@ std::unique_ptr<audio_modem::AudioModemDecoder> MakeDecoder(const DtmfTrial& tri
   audio_modem::DtmfDecoderConfig config = trial.config;
   config.input_sample_rate = static_cast<float>(rate);
   config.num_channels = channels;
-  return audio_modem::MakeDtmfAudioModemDecoder(config, trial.tuning);
+  config.narrowband_excision = false;
+  auto decoder = audio_modem::MakeDtmfAudioModemDecoder(config, trial.tuning);
+  if (decoder == nullptr) return decoder;
+  audio_vesknet::DtmfEncoderParams waveform;
+  CHECK(audio_modem::MakeDtmfEncoderParams(config, &waveform));
+  AddExcision(trial.excision, audio_modem::DtmfExcisionParams(waveform.tone_frequencies), rate,
+              channels, decoder.get());
+  return decoder;
 }
 
 int MessageBytes(const DtmfTrial& trial) {
@@ -68,6 +75,7 @@ int CountDtmfFalseTokens(const DtmfTrial& trial, double seconds, bool babble, ui
 }
 
 bool SetDtmfTuning(const std::string& assignment, DtmfTrial* trial) {
+  if (SetExcisionTuning(assignment, &trial->excision)) return true;
   std::string name;
   double value;
   if (!ParseAssignment(assignment, &name, &value)) return false;

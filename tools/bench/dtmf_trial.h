@@ -26,8 +26,9 @@ struct DtmfTrial {
   audio_vesknet::DtmfDecoderParams tuning;  // Decoder tuning (defaults).
   vesk_channel::ChannelParams channel;      // Set per experiment.
   DtmfWindow window = DtmfWindow::kConfigured;
-  int repeat = 3;    // Token repetitions played back to back.
-  bool crc = false;  // 3 message + 2 CRC bytes, or 5 raw bytes.
+  int repeat = 3;           // Token repetitions played back to back.
+  bool crc = false;         // 3 message + 2 CRC bytes, or 5 raw bytes.
+  ExcisionTuning excision;  // The stage in front of the decoder.
 };
 
 TrialResult RunDtmfTrial(const DtmfTrial& trial, uint64_t seed);
@@ -39,7 +40,8 @@ int CountDtmfFalseTokens(const DtmfTrial& trial, double seconds, bool babble, ui
 // Applies "name=value" to the decoder tuning (its field names, and
 // window_size, cross_frequency_weight, division_floor for the normalisation)
 // or to the receiver configuration (buffer_length_tokens,
-// max_tokens_per_call, checksum 0/1); false for an unknown name or bad value.
+// max_tokens_per_call, checksum 0/1) or to the excision stage (see
+// SetExcisionTuning); false for an unknown name or bad value.
 bool SetDtmfTuning(const std::string& assignment, DtmfTrial* trial);
 
 }  // namespace vesk_bench

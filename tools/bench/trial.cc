@@ -4,6 +4,8 @@
 #include <cstdlib>
 
 #include "tools/channel/babble.h"
+#include "tools/channel/noise.h"
+#include "tools/channel/random.h"
 
 namespace vesk_bench {
 
@@ -48,6 +50,46 @@ int CountFalseTokens(audio_modem::AudioModemDecoder* decoder, int rate, int mess
                   std::max(1, stream.broadcaster_answers());
   }
   return found;
+}
+
+bool SetExcisionTuning(const std::string& assignment, ExcisionTuning* tuning) {
+  std::string name;
+  double value;
+  if (!ParseAssignment(assignment, &name, &value)) return false;
+  audio_dsp::NarrowbandExcisionParams& p = tuning->params;
+  const float real = static_cast<float>(value);
+  const int whole = static_cast<int>(value);
+  if (name == "excision") {
+    tuning->on = value != 0;
+  } else if (name == "excision_threshold_db" && value > 0) {
+    p.threshold_db = real;
+  } else if (name == "excision_interval_s" && value > 0) {
+    p.analysis_interval_s = real;
+  } else if (name == "excision_confirmations" && whole >= 1) {
+    p.confirmations = whole;
+  } else if (name == "excision_release" && whole >= 1) {
+    p.release = whole;
+  } else if (name == "excision_notch_hz" && value > 0) {
+    p.notch_bandwidth_hz = real;
+  } else if (name == "excision_max_notches" && whole >= 0) {
+    p.max_notches = whole;
+  } else if (name == "excision_protect_hz" && value >= 0) {
+    p.protect_width_hz = real;
+  } else {
+    return false;
+  }
+  return true;
+}
+
+void AddExcision(const ExcisionTuning& tuning, const audio_dsp::NarrowbandExcisionParams& band,
+                 int rate, int channels, audio_modem::AudioModemDecoder* decoder) {
+  if (!tuning.on) return;
+  audio_dsp::NarrowbandExcisionParams params = tuning.params;
+  params.band_low_hz = band.band_low_hz;
+  params.band_high_hz = band.band_high_hz;
+  params.protected_hz = band.protected_hz;
+  decoder->SetNarrowbandExcision(params);
+  decoder->Initialize(static_cast<float>(rate), channels);
 }
 
 bool ParseAssignment(const std::string& assignment, std::string* name, double* value) {

@@ -28,6 +28,8 @@
 #include "tools/bench/sweep_table.h"
 #include "tools/channel/babble.h"
 #include "tools/channel/channel_simulator.h"
+#include "tools/channel/noise.h"
+#include "tools/channel/random.h"
 
 namespace vesk_bench {
 namespace {
@@ -85,7 +87,7 @@ void WakeTable(const Options& options, const char* table, const std::string& tit
         (sweep_speed ? air.channel.speed : air.channel.snr_db) = value;
         Point point;
         for (const double delay :
-             ForSeeds(options.bench.seeds, options.bench.threads,
+             ForSeeds(options.bench.seeds, options.bench.threads, options.bench.first_seed,
                       [&](uint64_t seed) { return WakeDelay(waveforms[series], air, seed); })) {
           if (delay < 0) continue;
           ++point.successes;
@@ -143,6 +145,7 @@ void TokenTable(const Options& options, CsvFile* csv) {
         trial.channel.snr_db = snr;
         trial.zintar = series == 0;
         return Summarize(ForSeeds(options.bench.seeds, options.bench.threads,
+                                  options.bench.first_seed,
                                   [&](uint64_t seed) { return RunDsssTrial(trial, seed); }));
       },
       csv);

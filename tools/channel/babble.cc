@@ -6,12 +6,11 @@
 #include <vector>
 
 #include "base/logging.h"
-#include "tools/channel/channel_simulator.h"
+#include "tools/channel/channel_constants.h"
+#include "tools/channel/random.h"
 
 namespace vesk_channel {
 namespace {
-
-constexpr double kPi = 3.14159265358979323846;
 
 // Average formant frequencies (Hz) of ten vowels of adult male speakers;
 // higher voices scale them up by up to 18 %.

@@ -8,7 +8,7 @@
 // rise and fall smoothly; phrases of 4 ... 12 syllables are separated by pauses
 // of 0.15 ... 0.6 s. Talkers start at random moments and are summed.
 //
-// Deterministic for a given seed (the generator of channel_simulator.h).
+// Deterministic for a given seed (the generator of random.h).
 // Stateless and thread-safe.
 
 #ifndef TOOLS_CHANNEL_BABBLE_H_

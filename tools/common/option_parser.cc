@@ -104,6 +104,16 @@ OptionParser::Option& OptionParser::Add(const std::string& name, Type type, void
     case Type::kFlag:
       option.default_text = *static_cast<bool*>(value) ? "on" : "off";
       break;
+    case Type::kList: {
+      const std::vector<double>& list = *static_cast<std::vector<double>*>(value);
+      for (size_t i = 0; i < list.size(); ++i) {
+        option.default_text += (i ? "," : "") + FormatNumber(list[i]);
+      }
+      if (list.empty()) option.default_text = "none";
+      break;
+    }
+    case Type::kChoice:
+      break;
   }
   return option;
 }
@@ -133,6 +143,11 @@ OptionParser::Option& OptionParser::AddFlag(const std::string& name, bool* value
   return Add(name, Type::kFlag, value, help);
 }
 
+OptionParser::Option& OptionParser::AddList(const std::string& name, std::vector<double>* value,
+                                            const std::string& help) {
+  return Add(name, Type::kList, value, help);
+}
+
 OptionParser::Option* OptionParser::Find(const std::string& name) {
   for (Option& option : options_) {
     if (option.name == name) return &option;
@@ -140,14 +155,9 @@ OptionParser::Option* OptionParser::Find(const std::string& name) {
   return nullptr;
 }
 
-bool OptionParser::Assign(const Option& option, const std::string& text, std::string* error) {
+bool OptionParser::ParseNumber(const Option& option, const std::string& text, double* number,
+                               std::string* error) {
   const std::string shown = "--" + option.name + " " + text;
-  if (!option.choices.empty() &&
-      std::find(option.choices.begin(), option.choices.end(), text) == option.choices.end()) {
-    *error = shown + ": must be one of " + JoinChoices(option.choices);
-    return false;
-  }
-  double number = 0.0;
   if (option.type == Type::kInt) {
     char* end = nullptr;
     errno = 0;
@@ -156,42 +166,71 @@ bool OptionParser::Assign(const Option& option, const std::string& text, std::st
       *error = "--" + option.name + " needs a whole number, not '" + text + "'";
       return false;
     }
-    number = static_cast<double>(v);
-  } else if (option.type == Type::kFloat || option.type == Type::kDouble) {
+    *number = static_cast<double>(v);
+  } else {
     char* end = nullptr;
     errno = 0;
-    number = std::strtod(text.c_str(), &end);
-    const bool overflow = errno == ERANGE && std::fabs(number) > 1.0;
+    *number = std::strtod(text.c_str(), &end);
+    const bool overflow = errno == ERANGE && std::fabs(*number) > 1.0;
     const double limit = option.type == Type::kFloat ? FLT_MAX : DBL_MAX;
-    if (text.empty() || *end != '\0' || std::isnan(number) || overflow ||
-        (std::isfinite(number) && std::fabs(number) > limit)) {
+    if (text.empty() || *end != '\0' || std::isnan(*number) || overflow ||
+        (std::isfinite(*number) && std::fabs(*number) > limit)) {
       *error = "--" + option.name + " needs a number, not '" + text + "'";
       return false;
     }
   }
-  if (option.type != Type::kString) {
-    if (!option.has_range && !std::isfinite(number)) {
-      *error = "--" + option.name + " needs a finite number, not '" + text + "'";
-      return false;
-    }
-    if (option.has_range && !(number >= option.min && number <= option.max)) {
-      *error = shown + ": out of range (" + FormatBound(option.type, option.min) + " to " +
-               FormatBound(option.type, option.max) + ")";
-      return false;
-    }
+  if (!option.has_range && !std::isfinite(*number)) {
+    *error = "--" + option.name + " needs a finite number, not '" + text + "'";
+    return false;
   }
+  if (option.has_range && !(*number >= option.min && *number <= option.max)) {
+    *error = shown + ": out of range (" + FormatBound(option.type, option.min) + " to " +
+             FormatBound(option.type, option.max) + ")";
+    return false;
+  }
+  return true;
+}
+
+bool OptionParser::Assign(const Option& option, const std::string& text, std::string* error) {
+  const auto choice = std::find(option.choices.begin(), option.choices.end(), text);
+  if (!option.choices.empty() && choice == option.choices.end()) {
+    *error = "--" + option.name + " " + text + ": must be one of " + JoinChoices(option.choices);
+    return false;
+  }
+  double number = 0.0;
   switch (option.type) {
     case Type::kInt:
+      if (!ParseNumber(option, text, &number, error)) return false;
       *static_cast<int*>(option.value) = static_cast<int>(number);
       break;
     case Type::kFloat:
+      if (!ParseNumber(option, text, &number, error)) return false;
       *static_cast<float*>(option.value) = static_cast<float>(number);
       break;
     case Type::kDouble:
+      if (!ParseNumber(option, text, &number, error)) return false;
       *static_cast<double*>(option.value) = number;
       break;
     case Type::kString:
       *static_cast<std::string*>(option.value) = text;
+      break;
+    case Type::kList: {
+      std::vector<double> list;
+      std::stringstream items(text);
+      std::string item;
+      while (!text.empty() && std::getline(items, item, ',')) {
+        if (!ParseNumber(option, item, &number, error)) return false;
+        list.push_back(number);
+      }
+      if (!text.empty() && text.back() == ',') {
+        *error = "--" + option.name + " needs a number after every comma, not '" + text + "'";
+        return false;
+      }
+      *static_cast<std::vector<double>*>(option.value) = list;
+      break;
+    }
+    case Type::kChoice:
+      option.select(static_cast<size_t>(choice - option.choices.begin()));
       break;
     case Type::kFlag:
       break;
@@ -301,7 +340,11 @@ std::string OptionParser::Help() const {
     std::string name = "--" + option.name;
     std::string placeholder = option.placeholder;
     if (placeholder.empty()) {
-      placeholder = option.type == Type::kInt ? "N" : option.type == Type::kString ? "TEXT" : "X";
+      placeholder = option.type == Type::kInt      ? "N"
+                    : option.type == Type::kString ? "TEXT"
+                    : option.type == Type::kList   ? "X,..."
+                    : option.type == Type::kChoice ? "NAME"
+                                                   : "X";
     }
     if (option.type == Type::kFlag) {
       name = "--[no-]" + option.name;

@@ -4,6 +4,8 @@
 //   parser.AddInt("repeat", &repeat, "token repetitions").Range(1, 100);
 //   parser.AddFlag("crc", &crc, "append CRC-16 bytes");   // --crc / --no-crc
 //   parser.AddString("preset", &preset, "coder").Choices({"48k", "44k"});
+//   parser.AddList("tones", &tones, "Hz").Range(1, 24000);   // --tones 1200,18600
+//   parser.AddChoice("speaker", &profile, {{"flat", kFlat}, {"budget", kBudget}}, "...");
 //   if (!parser.Parse(args, &error)) ...            // error names option and value
 //   if (parser.help_requested()) print parser.Help();
 //
@@ -20,21 +22,25 @@
 #ifndef TOOLS_COMMON_OPTION_PARSER_H_
 #define TOOLS_COMMON_OPTION_PARSER_H_
 
+#include <cstddef>
 #include <deque>
+#include <functional>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace vesk_tool {
 
 class OptionParser {
  public:
-  enum class Type { kInt, kFloat, kDouble, kString, kFlag };
+  enum class Type { kInt, kFloat, kDouble, kString, kFlag, kList, kChoice };
 
   // One registered option. The setters return the option for chaining.
   class Option {
    public:
-    // Numbers: the value must lie in [min, max]; an infinite bound admits
-    // "inf" (or "-inf") as a value. Without a range any finite number passes.
+    // Numbers (and each number of a list): the value must lie in [min, max];
+    // an infinite bound admits "inf" (or "-inf") as a value. Without a range
+    // any finite number passes.
     Option& Range(double min, double max);
     // Strings and whole numbers: the value must be one of `choices` (as written).
     Option& Choices(std::vector<std::string> choices);
@@ -54,6 +60,7 @@ class OptionParser {
     double max = 0.0;
     std::vector<std::string> choices;
     std::string placeholder;
+    std::function<void(size_t)> select;  // kChoice: stores choice i.
   };
 
   OptionParser() = default;
@@ -67,6 +74,26 @@ class OptionParser {
   Option& AddDouble(const std::string& name, double* value, const std::string& help);
   Option& AddString(const std::string& name, std::string* value, const std::string& help);
   Option& AddFlag(const std::string& name, bool* value, const std::string& help);
+  // Comma-separated numbers ("" for none) into *value.
+  Option& AddList(const std::string& name, std::vector<double>* value, const std::string& help);
+  // One of the names of `choices`; stores its value in *value. The default
+  // shown is the name of *value's value at registration.
+  template <typename T>
+  Option& AddChoice(const std::string& name, T* value,
+                    const std::vector<std::pair<std::string, T>>& choices,
+                    const std::string& help) {
+    std::vector<std::string> names;
+    std::string current;
+    for (const auto& choice : choices) {
+      names.push_back(choice.first);
+      if (choice.second == *value) current = choice.first;
+    }
+    Option& option = Add(name, Type::kChoice, nullptr, help);
+    option.default_text = current;
+    option.choices = names;
+    option.select = [value, choices](size_t i) { *value = choices[i].second; };
+    return option;
+  }
 
   // Parses `args` into the registered variables. Arguments that are not
   // options are collected in positional(). Returns false with a one-line
@@ -92,6 +119,9 @@ class OptionParser {
   Option& Add(const std::string& name, Type type, void* value, const std::string& help);
   Option* Find(const std::string& name);
   static bool Assign(const Option& option, const std::string& text, std::string* error);
+  // A number of `option`'s type and range from `text`; false with *error.
+  static bool ParseNumber(const Option& option, const std::string& text, double* number,
+                          std::string* error);
 
   std::deque<Option> options_;  // A deque: Add() hands out references that must stay valid.
   std::vector<std::string> positional_;

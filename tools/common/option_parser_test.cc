@@ -127,6 +127,35 @@ TEST(OptionParserTest, HelpShowsTheDefaultsAtRegistrationAndTheRanges) {
   EXPECT_NE(help.find("carrier, Hz (default 18500)"), std::string::npos) << help;
 }
 
+enum class Size { kSmall, kLarge };
+
+TEST(OptionParserTest, ListsAndChoices) {
+  std::vector<double> tones = {1200};
+  Size size = Size::kLarge;
+  OptionParser parser;
+  parser.AddList("tones", &tones, "tones, Hz").Range(1, 24000);
+  parser.AddChoice("size", &size, {{"small", Size::kSmall}, {"large", Size::kLarge}}, "size");
+  const std::string help = parser.Help();
+  EXPECT_NE(help.find("--tones X,..."), std::string::npos) << help;
+  EXPECT_NE(help.find("tones, Hz (1 to 24000; default 1200)"), std::string::npos) << help;
+  EXPECT_NE(help.find("--size NAME"), std::string::npos) << help;
+  EXPECT_NE(help.find("size (one of small, large; default large)"), std::string::npos) << help;
+  std::string error;
+  ASSERT_TRUE(parser.Parse({"--tones", "18600,19000.5", "--size", "small"}, &error)) << error;
+  EXPECT_EQ(tones, (std::vector<double>{18600, 19000.5}));
+  EXPECT_EQ(size, Size::kSmall);
+  ASSERT_TRUE(parser.Parse({"--tones="}, &error)) << error;
+  EXPECT_TRUE(tones.empty());
+  EXPECT_FALSE(parser.Parse({"--tones", "100,30000"}, &error));
+  EXPECT_EQ(error, "--tones 30000: out of range (1 to 24000)");
+  EXPECT_FALSE(parser.Parse({"--tones", "100,"}, &error));
+  EXPECT_EQ(error, "--tones needs a number after every comma, not '100,'");
+  EXPECT_FALSE(parser.Parse({"--tones", "1,x"}, &error));
+  EXPECT_EQ(error, "--tones needs a number, not 'x'");
+  EXPECT_FALSE(parser.Parse({"--size", "medium"}, &error));
+  EXPECT_EQ(error, "--size medium: must be one of small, large");
+}
+
 TEST(OptionParserTest, LongHelpWrapsUnderItsColumn) {
   int value = 0;
   OptionParser parser;

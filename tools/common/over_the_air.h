@@ -14,6 +14,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <string>
 #include <vector>
 
 #include "social/tandry/audio/audio_modem_decoder.h"
@@ -32,11 +33,30 @@ struct OverTheAir {
 };
 
 // Registers the options that describe `air`, with its current values as the
-// defaults: --repeat, --snr, --speed, --reverb, --rt60, --mic-rate,
-// --channels, --babble, --lead-in, --random-lead-in and --tail, each with the
-// range the simulator accepts. vesk demo and every robustness program take
-// these; a new channel impairment becomes an option of all of them here.
+// defaults, each with the range the simulator accepts: the room (--repeat,
+// --snr, --speed, --reverb, --rt60, --mic-rate, --channels, --babble,
+// --lead-in, --random-lead-in, --tail, --level) and the impairments of real
+// phones and rooms (--speaker, --microphone, --overdrive, --agc,
+// --agc-interval, --dropout, --dropout-every, --walk, --walk-closest,
+// --tones, --random-tones, --tone-band-low, --tone-band-high, --tone-sir,
+// --impulses, --impulse-peak, --second, --second-offset). vesk demo and
+// every robustness program take these; a new channel impairment becomes an
+// option of all of them here.
 void AddOverTheAirOptions(OptionParser* parser, OverTheAir* air);
+
+// Empty when the options' values fit together (what single ranges cannot
+// say: tones below half the microphone rate, a tone band in order, a second
+// transmitter that starts within the recording); otherwise a sentence naming
+// the option. Check it after parsing, before a trial.
+std::string OverTheAirError(const OverTheAir& air);
+
+// The impairments of `channel` that are on, in words for a report
+// ("budget speaker, overdrive 6 dB, ..."); "none" when none is.
+std::string DescribeImpairments(const vesk_channel::ChannelParams& channel);
+
+// The token a second transmitter sends when the channel has one: the
+// message with every byte inverted, so that it differs in every byte.
+std::vector<uint8_t> SecondMessage(const std::vector<uint8_t>& message);
 
 // What a transmitter plays for one token: the start transition (none for
 // DTMF), then the token audio `repeat` times; floats in -1 ... 1 at
@@ -49,8 +69,9 @@ struct Playback {
 Playback MakePlayback(const audio_modem::AudioModemEncoder& encoder,
                       const std::vector<uint8_t>& message, int crc_bytes, int repeat);
 
-// MakePlayback() played through air.channel: the microphone's 16-bit PCM.
-// The encoder must accept the token.
+// MakePlayback() played through air.channel (with SecondMessage(message)
+// from the same encoder as the second transmitter when the channel has one):
+// the microphone's 16-bit PCM. The encoder must accept the token.
 vesk_channel::ChannelOutput PlayOverTheAir(const audio_modem::AudioModemEncoder& encoder,
                                            const std::vector<uint8_t>& message, int crc_bytes,
                                            const OverTheAir& air);
@@ -67,6 +88,8 @@ struct Reception {
   double signal_start_s = 0.0;        // Stream time of the transmission's first sample.
   float transmit_rate = 0.0f;         // Hz, of the transmitter's audio.
   size_t token_samples = 0;           // Of one repetition, at transmit_rate.
+  // The second transmitter's message; empty when the channel has none.
+  std::vector<uint8_t> second_message;
 };
 
 // PlayOverTheAir(), then decodes the microphone PCM with a decoder from
@@ -83,10 +106,11 @@ Reception SendOverTheAir(const audio_modem::AudioModemEncoder& encoder,
 
 // A reception judged against the message sent.
 struct TrialResult {
-  bool correct = false;       // The sent token was reported.
-  int wrong = 0;              // Other tokens reported.
-  double found_delay_s = -1;  // From the signal's start to the first correct report.
-  double heard_delay_s = -1;  // From the signal's start to DetectBroadcaster's first true.
+  bool correct = false;         // The sent token was reported.
+  bool second_correct = false;  // The second transmitter's token was reported.
+  int wrong = 0;                // Tokens that neither transmitter sent.
+  double found_delay_s = -1;    // From the signal's start to the first correct report.
+  double heard_delay_s = -1;    // From the signal's start to DetectBroadcaster's first true.
 };
 
 TrialResult Judge(const Reception& reception, const std::vector<uint8_t>& message);

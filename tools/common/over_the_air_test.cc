@@ -82,6 +82,46 @@ TEST(OverTheAirTest, JudgeCountsWrongTokensAndTimesTheFirstRightOne) {
   EXPECT_EQ(nothing.heard_delay_s, -1);
 }
 
+TEST(OverTheAirTest, JudgeTellsTheSecondTransmittersTokenFromWrongOnes) {
+  Reception reception;
+  reception.second_message = SecondMessage(kMessage);
+  EXPECT_EQ(reception.second_message, (std::vector<uint8_t>{254, 253, 252, 251, 250, 249}));
+  reception.found = {{1.0, reception.second_message}, {2.0, {9}}};
+  TrialResult result = Judge(reception, kMessage);
+  EXPECT_FALSE(result.correct);
+  EXPECT_TRUE(result.second_correct);
+  EXPECT_EQ(result.wrong, 1);
+  // Without a second transmitter its token would be wrong.
+  reception.second_message.clear();
+  result = Judge(reception, kMessage);
+  EXPECT_FALSE(result.second_correct);
+  EXPECT_EQ(result.wrong, 2);
+}
+
+TEST(OverTheAirTest, ASecondTransmitterSendsTheOtherToken) {
+  const auto encoder = audio_modem::MakeDsssAudioModemEncoder(audio_modem::DsssEncoderConfig());
+  OverTheAir air;
+  air.repeat = 2;
+  air.channel.snr_db = 10;
+  air.channel.second_power_db = -6;
+  air.channel.second_offset_s = 1.0;
+  air.channel.tail_s = 2.0;
+  const Reception reception =
+      SendOverTheAir(*encoder, kMessage, 2, air,
+                     [](int rate, int channels) {
+                       audio_modem::DsssDecoderConfig config;
+                       config.input_sample_rate = static_cast<float>(rate);
+                       config.num_channels = channels;
+                       return audio_modem::MakeDsssAudioModemDecoder(config);
+                     },
+                     {});
+  EXPECT_EQ(reception.second_message, SecondMessage(kMessage));
+  const TrialResult result = Judge(reception, kMessage);
+  EXPECT_TRUE(result.correct);
+  EXPECT_TRUE(result.second_correct);
+  EXPECT_EQ(result.wrong, 0);
+}
+
 TEST(OverTheAirTest, OptionsSetTheRoomWithinTheSimulatorsRanges) {
   OverTheAir air;
   air.channel.lead_in_s = 0.5;
@@ -115,9 +155,111 @@ TEST(OverTheAirTest, OptionsSetTheRoomWithinTheSimulatorsRanges) {
                                              {"--repeat", "0"},
                                              {"--mic-rate", "4000"},
                                              {"--snr", "-inf"},
-                                             {"--tail", "-1"}}) {
+                                             {"--tail", "-1"},
+                                             {"--speaker", "cheap"},
+                                             {"--overdrive", "-1"},
+                                             {"--tones", "0"},
+                                             {"--walk", "4"},
+                                             {"--second", "inf"},
+                                             {"--music-harmonics", "0"}}) {
     EXPECT_FALSE(parser.Parse(bad, &error)) << bad[0];
   }
+}
+
+TEST(OverTheAirTest, ImpairmentOptionsSetTheChannel) {
+  OverTheAir air;
+  OptionParser parser;
+  AddOverTheAirOptions(&parser, &air);
+  std::string error;
+  ASSERT_TRUE(parser.Parse({"--level",
+                            "-30",
+                            "--speaker",
+                            "budget",
+                            "--microphone",
+                            "flagship",
+                            "--overdrive",
+                            "6",
+                            "--agc",
+                            "20",
+                            "--agc-interval",
+                            "2",
+                            "--dropout",
+                            "0.04",
+                            "--dropout-every",
+                            "0.5",
+                            "--walk",
+                            "1.2",
+                            "--walk-closest",
+                            "0.7",
+                            "--tones",
+                            "1200,18600",
+                            "--random-tones",
+                            "2",
+                            "--tone-band-low",
+                            "15500",
+                            "--tone-band-high",
+                            "21500",
+                            "--tone-sir",
+                            "-20",
+                            "--impulses",
+                            "2",
+                            "--impulse-peak",
+                            "30",
+                            "--second",
+                            "-6",
+                            "--second-offset",
+                            "0.2",
+                            "--music",
+                            "3",
+                            "--music-harmonics",
+                            "24"},
+                           &error))
+      << error;
+  const vesk_channel::ChannelParams& c = air.channel;
+  EXPECT_EQ(c.level_db, -30);
+  EXPECT_EQ(c.speaker, vesk_channel::DeviceProfile::kBudgetPhone);
+  EXPECT_EQ(c.microphone, vesk_channel::DeviceProfile::kFlagshipPhone);
+  EXPECT_EQ(c.overdrive_db, 6);
+  EXPECT_EQ(c.agc.step_db, 20);
+  EXPECT_EQ(c.agc.interval_s, 2);
+  EXPECT_EQ(c.dropouts.length_s, 0.04);
+  EXPECT_EQ(c.dropouts.interval_s, 0.5);
+  EXPECT_EQ(c.walk_speed_mps, 1.2);
+  EXPECT_EQ(c.walk_closest_m, 0.7);
+  EXPECT_EQ(c.tone_frequencies_hz, (std::vector<double>{1200, 18600}));
+  EXPECT_EQ(c.random_tones, 2);
+  EXPECT_EQ(c.random_tone_low_hz, 15500);
+  EXPECT_EQ(c.random_tone_high_hz, 21500);
+  EXPECT_EQ(c.tone_sir_db, -20);
+  EXPECT_EQ(c.impulses.per_second, 2);
+  EXPECT_EQ(c.impulses.peak_over_signal_db, 30);
+  EXPECT_EQ(c.second_power_db, -6);
+  EXPECT_EQ(c.second_offset_s, 0.2);
+  EXPECT_EQ(c.music_sir_db, 3);
+  EXPECT_EQ(c.music.harmonics, 24);
+  EXPECT_EQ(OverTheAirError(air), "");
+}
+
+TEST(OverTheAirTest, OptionsThatDoNotFitTogetherAreRefused) {
+  OverTheAir air;
+  air.channel.tone_frequencies_hz = {23000};
+  EXPECT_EQ(OverTheAirError(air),
+            "--tones 23000: a tone must lie below half the microphone rate (22050 Hz)");
+  air.channel.tone_frequencies_hz.clear();
+  air.channel.random_tones = 1;
+  EXPECT_EQ(OverTheAirError(air),
+            "--random-tones: the tone band needs 0 < --tone-band-low <= --tone-band-high");
+  air.channel.random_tone_low_hz = 15000;
+  air.channel.random_tone_high_hz = 23000;
+  EXPECT_EQ(OverTheAirError(air),
+            "--tone-band-high 23000: must lie below half the microphone rate (22050 Hz)");
+  air.channel.mic_rate = 48000;
+  EXPECT_EQ(OverTheAirError(air), "");
+  air.channel.second_power_db = 0;
+  air.channel.second_offset_s = -0.5;
+  EXPECT_EQ(OverTheAirError(air),
+            "--second-offset -0.5: the second transmitter may start at most --lead-in (0.2 s) "
+            "before the first");
 }
 
 }  // namespace

@@ -9,6 +9,7 @@
 #include "social/tandry/audio/audio_modem_decoder.h"
 #include "social/tandry/audio/audio_modem_encoder.h"
 #include "tools/channel/channel_simulator.h"
+#include "tools/channel/noise.h"
 #include "tools/common/over_the_air.h"
 #include "tools/common/stream_decoding.h"
 

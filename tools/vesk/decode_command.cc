@@ -137,6 +137,8 @@ ParseOutcome ParseDecodeArgs(const std::vector<std::string>& args, DecodeRequest
         .Range(1, 100);
     parser.AddInt("tokens-per-call", &r.dtmf_config.max_tokens_per_call, "tokens per request")
         .Range(1, audio_modem::kMaxDtmfTokensPerCall);
+    parser.AddFlag("excision", &r.dtmf_config.narrowband_excision,
+                   "notch steady tones between the modem's tones out of the input");
   } else {
     AddDtmfSwitch(&parser, &r.dtmf);
     AddDsssOptions(&parser, &dsss);
@@ -151,6 +153,8 @@ ParseOutcome ParseDecodeArgs(const std::vector<std::string>& args, DecodeRequest
     parser.AddInt("tokens-per-call", &c.max_tokens_per_call, "tokens per request")
         .Range(1, audio_vesknet::VesknetDecoderParams().max_candidates_rank);
     parser.AddFlag("design-filter", &c.design_baseband_filter, "designed baseband low-pass");
+    parser.AddFlag("excision", &c.narrowband_excision,
+                   "notch steady tones in the DSSS band out of the input (not with --zintar)");
     parser.AddFlag("zintar", &c.use_zintar,
                    "zintar listening mode: hears only the 48k preset, needs >= 36994 Hz input, "
                    "no Doppler tolerance beyond about 0.1%");

@@ -84,6 +84,7 @@ ParseOutcome ParseDemoArgs(const std::vector<std::string>& args, DemoRequest* re
             " demo sends the product token of " + std::to_string(bytes) + " bytes";
   }
   if (error.empty() && r.dtmf && r.zintar) error = "--zintar listens for DSSS tokens only";
+  if (error.empty()) error = OverTheAirError(r.air);
   if (error.empty()) {
     error =
         r.dtmf ? audio_modem::DtmfDecoderConfigError(DtmfReceiver(room.mic_rate, room.channels))
@@ -129,6 +130,10 @@ bool ReportDemo(const DemoRequest& request, const Reception& reception, std::ost
                 room.snr_db, room.speed, reverb, room.mic_rate, room.channels == 2 ? " stereo" : "",
                 request.zintar ? " (listening mode)" : "", reception.signal_start_s);
   out << line;
+  if (DescribeImpairments(room) != "none") out << "extra:    " << DescribeImpairments(room) << "\n";
+  if (!reception.second_message.empty()) {
+    out << "other:    a second transmitter sends " << ToHex(reception.second_message) << "\n";
+  }
   if (reception.broadcaster_time_s >= 0) {
     std::snprintf(line, sizeof(line), "heard:    a transmitter at %.3f s\n",
                   reception.broadcaster_time_s);
@@ -137,9 +142,13 @@ bool ReportDemo(const DemoRequest& request, const Reception& reception, std::ost
   bool correct = false;
   for (const FoundToken& token : reception.found) {
     const bool match = token.bytes == request.message;
+    const bool other = !reception.second_message.empty() && token.bytes == reception.second_message;
     correct = correct || match;
     std::snprintf(line, sizeof(line), "decoded:  %s at %.3f s%s\n", ToHex(token.bytes).c_str(),
-                  token.time_s, match ? "  (correct)" : "  (WRONG)");
+                  token.time_s,
+                  match   ? "  (correct)"
+                  : other ? "  (the second transmitter's)"
+                          : "  (WRONG)");
     out << line;
   }
   if (reception.found.empty()) out << "decoded:  nothing\n";

@@ -312,6 +312,20 @@ TEST(VeskToolTest, ExitStatusesAreZeroForATokenOneForNoneTwoForErrors) {
   EXPECT_EQ(Vesk({"demo", "--snr", "-30"}).exit_status, 1);
 }
 
+// The demo's impairment options reach its room, and decode's --no-excision
+// turns the stage off: a tone 20 dB over the token stops the decoder only
+// then.
+TEST(VeskToolTest, ATokenUnderASteadyToneIsHeardOnlyThroughTheExcisionStage) {
+  const std::string path = TempPath("vesk_tool_test_tone.wav");
+  const ProcessResult demo = Vesk({"demo", "--tones", "18600", "--tone-sir", "-20", "--snr", "10",
+                                   "--no-reverb", "--save", path});
+  EXPECT_EQ(demo.exit_status, 0) << demo.out << demo.err;
+  EXPECT_NE(demo.out.find("extra:    1 tone 18600 Hz at signal-to-tone -20 dB"), std::string::npos)
+      << demo.out;
+  EXPECT_EQ(Vesk({"decode", path}).exit_status, 0);
+  EXPECT_EQ(Vesk({"decode", "--no-excision", path}).exit_status, 1);
+}
+
 TEST(VeskToolTest, RefusedOptionsNameTheOptionTheValueAndTheRangeOrReason) {
   const std::vector<std::pair<std::vector<std::string>, std::string>> cases = {
       {{"encode", "--broadcast-rate", "8000", "-"},
@@ -366,6 +380,8 @@ TEST(VeskToolTest, RefusedOptionsNameTheOptionTheValueAndTheRangeOrReason) {
        "vesk demo: --mic-rate 16000: the zintar listening mode needs a microphone rate of at "
        "least 36994 Hz"},
       {{"demo", "--dtmf", "--zintar"}, "vesk demo: --zintar listens for DSSS tokens only"},
+      {{"demo", "--tones", "30000"},
+       "vesk demo: --tones 30000: a tone must lie below half the microphone rate (22050 Hz)"},
   };
   for (const auto& c : cases) {
     const ProcessResult run = Vesk(c.first, "\x01\x02");

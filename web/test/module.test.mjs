@@ -154,6 +154,7 @@ test('defaults are the C interface\'s', () => {
     microphone_rate_hz: 44100, channels: 1, listening_mode: 0, max_tokens_per_call: 2,
     buffer_length_tokens: 4, acquisition_window_seconds: 0.75, broadcaster_threshold: 5,
     design_baseband_filter: 0, poll_interval_seconds: 0.25, hold_seconds: 3,
+    narrowband_excision: 1,
   });
   // A partial configuration is completed with its modem's defaults.
   const encoder = vesk.encoder({ modem: 'dtmf', message_bytes: 3 });

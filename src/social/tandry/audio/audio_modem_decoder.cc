@@ -33,20 +33,46 @@ AudioModemDecoder::AudioModemDecoder(std::unique_ptr<audio_vesknet::DtmfDecoder>
 AudioModemDecoder::~AudioModemDecoder() = default;
 
 void AudioModemDecoder::Initialize(float sample_rate, int num_channels) {
+  if (excision_params_ != nullptr && kind_ != kZintar) {
+    excision_params_->sample_rate = sample_rate;
+    excision_params_->num_channels = num_channels;
+    excision_ = std::make_unique<audio_dsp::NarrowbandExcision>(*excision_params_);
+  }
   if (kind_ == kDsss) dsss_decoder_->Initialize(sample_rate, num_channels);
   if (kind_ == kZintar) zintar_decoder_->Initialize(sample_rate, num_channels);
   if (kind_ == kDtmf) dtmf_decoder_->Init(sample_rate, num_channels);
 }
 
+void AudioModemDecoder::SetNarrowbandExcision(const audio_dsp::NarrowbandExcisionParams& params) {
+  excision_params_ = std::make_unique<audio_dsp::NarrowbandExcisionParams>(params);
+  excision_.reset();
+}
+
+const std::vector<float>& AudioModemDecoder::Condition(const std::vector<float>& samples) {
+  if (excision_ == nullptr) return samples;
+  const int count = static_cast<int>(samples.size());
+  excision_->Analyze(samples.data(), count);
+  if (!excision_->filtering()) return samples;
+  if (&samples == &samples_) {
+    excision_->Filter(samples_.data(), count);
+    return samples_;
+  }
+  conditioned_.assign(samples.begin(), samples.end());
+  excision_->Filter(conditioned_.data(), count);
+  return conditioned_;
+}
+
 void AudioModemDecoder::ProcessSamples(const std::vector<float>& samples) {
-  if (kind_ == kDsss) dsss_decoder_->ProcessSamples(samples);
   if (kind_ == kZintar) {
     // The values came from 16-bit samples: truncation restores them.
     raw_.resize(samples.size());
     for (size_t i = 0; i < samples.size(); ++i) raw_[i] = static_cast<int16_t>(samples[i]);
     zintar_decoder_->ProcessSamples(raw_.data(), static_cast<int>(raw_.size()));
+    return;
   }
-  if (kind_ == kDtmf) dtmf_decoder_->ProcessSamples(samples);
+  const std::vector<float>& input = Condition(samples);
+  if (kind_ == kDsss) dsss_decoder_->ProcessSamples(input);
+  if (kind_ == kDtmf) dtmf_decoder_->ProcessSamples(input);
 }
 
 void AudioModemDecoder::ProcessPcm16(const int16_t* samples, int count) {
@@ -74,6 +100,7 @@ bool AudioModemDecoder::DetectBroadcaster() {
 }
 
 void AudioModemDecoder::WipeInternalData() {
+  if (excision_ != nullptr) excision_->Reset();
   if (kind_ == kDsss) dsss_decoder_->WipeInternalData();
   if (kind_ == kZintar) zintar_decoder_->WipeInternalData();
   if (kind_ == kDtmf) dtmf_decoder_->Reset();
@@ -241,6 +268,26 @@ std::string DsssDecoderConfigError(const DsssDecoderConfig& config) {
   return std::string();
 }
 
+audio_dsp::NarrowbandExcisionParams DsssExcisionParams(const DsssWaveformConfig& waveform) {
+  const float chip_rate = waveform.sample_rate / static_cast<float>(waveform.upsampling_factor);
+  audio_dsp::NarrowbandExcisionParams params;
+  params.band_low_hz = std::max(0.0f, waveform.carrier_frequency - chip_rate);
+  params.band_high_hz = waveform.carrier_frequency + chip_rate;
+  return params;
+}
+
+audio_dsp::NarrowbandExcisionParams DtmfExcisionParams(const std::vector<float>& tones_hz) {
+  // Beyond the outer tones a line leaks little into the tone filters.
+  constexpr float kMarginHz = 100.0f;
+  audio_dsp::NarrowbandExcisionParams params;
+  if (tones_hz.empty()) return params;
+  params.band_low_hz =
+      std::max(0.0f, *std::min_element(tones_hz.begin(), tones_hz.end()) - kMarginHz);
+  params.band_high_hz = *std::max_element(tones_hz.begin(), tones_hz.end()) + kMarginHz;
+  params.protected_hz = tones_hz;
+  return params;
+}
+
 std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(const DsssDecoderConfig& config) {
   return MakeDsssAudioModemDecoder(config, audio_vesknet::VesknetDecoderParams());
 }
@@ -271,6 +318,9 @@ std::unique_ptr<AudioModemDecoder> MakeDsssAudioModemDecoder(
         std::move(clock)));
   } else {
     decoder = std::make_unique<AudioModemDecoder>(std::move(dsss_decoder));
+  }
+  if (config.narrowband_excision) {
+    decoder->SetNarrowbandExcision(DsssExcisionParams(config.waveform));
   }
   decoder->Initialize(config.input_sample_rate, config.num_channels);
   return decoder;
@@ -312,6 +362,9 @@ std::unique_ptr<AudioModemDecoder> MakeDtmfAudioModemDecoder(
       config.buffer_length_tokens * audio_vesknet::GetTokenDurationSeconds(params);
   auto decoder =
       std::make_unique<AudioModemDecoder>(std::make_unique<audio_vesknet::DtmfDecoder>(params));
+  if (config.narrowband_excision) {
+    decoder->SetNarrowbandExcision(DtmfExcisionParams(params.tone_frequencies));
+  }
   decoder->Initialize(config.input_sample_rate, config.num_channels);
   return decoder;
 }

@@ -1,5 +1,6 @@
 #include "social/tandry/audio/audio_modem_decoder.h"
 
+#include <cmath>
 #include <cstdint>
 #include <vector>
 
@@ -73,6 +74,75 @@ TEST(AudioModemDecoderTest, SixteenBitBlocksAreTheirFloatValues) {
     EXPECT_EQ(a.frame_times, b.frame_times);
     EXPECT_EQ(a.frame_scores, b.frame_scores);
   }
+}
+
+// A steady tone 20 dB over the token, 300 Hz above the carrier: the
+// excision stage notches it and the token is heard; without the stage it is
+// not. Blocks go in as the caller's floats and as 16-bit PCM (the stage
+// then notches the front's own copy).
+TEST(AudioModemDecoderTest, ExcisionStageTakesASteadyToneAwayFromTheDecoder) {
+  std::vector<float> played = Played(kMessage, 2);
+  double power = 0;
+  for (float s : played) power += static_cast<double>(s) * s;
+  const double amplitude = 10 * std::sqrt(2 * power / played.size());
+  for (size_t i = 0; i < played.size(); ++i) {
+    played[i] =
+        0.05f * played[i] +
+        static_cast<float>(0.05 * amplitude * std::sin(2 * 3.14159265358979 * 18800.0 * i / 48000));
+  }
+  std::vector<int16_t> pcm(played.begin(), played.end());
+  for (const bool excision : {true, false}) {
+    DsssDecoderConfig config;
+    config.input_sample_rate = 48000;
+    config.narrowband_excision = excision;
+    const auto floats = MakeDsssAudioModemDecoder(config);
+    const auto ints = MakeDsssAudioModemDecoder(config);
+    ASSERT_EQ(floats->narrowband_excision() != nullptr, excision);
+    for (size_t start = 0; start < played.size(); start += 4096) {
+      const size_t end = std::min(played.size(), start + 4096);
+      floats->ProcessSamples(std::vector<float>(played.begin() + start, played.begin() + end));
+      ints->ProcessPcm16(pcm.data() + start, static_cast<int>(end - start));
+    }
+    DecodeResults a, b;
+    EXPECT_EQ(floats->GetTokens(&a, 6, 2), excision);
+    EXPECT_EQ(ints->GetTokens(&b, 6, 2), excision);
+    if (!excision) continue;
+    EXPECT_EQ(a.tokens.at(0).bytes, kMessage);
+    EXPECT_EQ(b.tokens.at(0).bytes, kMessage);
+    const std::vector<float> notches = floats->narrowband_excision()->NotchFrequencies();
+    ASSERT_EQ(notches.size(), 1u);
+    EXPECT_NEAR(notches[0], 18800.0f, 0.5f);
+    // Forgetting the audio forgets the tone.
+    floats->WipeInternalData();
+    EXPECT_FALSE(floats->narrowband_excision()->filtering());
+  }
+}
+
+TEST(AudioModemDecoderTest, ExcisionBandsFollowTheModemAndSpareTheListeningMode) {
+  DsssDecoderConfig config;
+  EXPECT_TRUE(config.narrowband_excision);
+  config.num_channels = 2;
+  const auto decoder = MakeDsssAudioModemDecoder(config);
+  const audio_dsp::NarrowbandExcisionParams& dsss = decoder->narrowband_excision()->params();
+  // The carrier +- the chip rate, 48000 / 16 Hz; the decoder's input.
+  EXPECT_EQ(dsss.band_low_hz, 15500.0f);
+  EXPECT_EQ(dsss.band_high_hz, 21500.0f);
+  EXPECT_EQ(dsss.sample_rate, 44100.0f);
+  EXPECT_EQ(dsss.num_channels, 2);
+  EXPECT_TRUE(dsss.protected_hz.empty());
+  config.num_channels = 1;
+  config.input_sample_rate = 48000;
+  config.use_zintar = true;
+  EXPECT_EQ(MakeDsssAudioModemDecoder(config)->narrowband_excision(), nullptr);
+  // DTMF: the tone set, 100 Hz wider, its tones protected.
+  const auto dtmf = MakeDtmfAudioModemDecoder(DtmfDecoderConfig());
+  const audio_dsp::NarrowbandExcisionParams& tones = dtmf->narrowband_excision()->params();
+  EXPECT_EQ(tones.band_low_hz, 640.0f);
+  EXPECT_NEAR(tones.band_high_hz, 2589.0f, 0.1f);
+  EXPECT_EQ(tones.protected_hz, audio_vesknet::DtmfEncoderParams().tone_frequencies);
+  DtmfDecoderConfig off;
+  off.narrowband_excision = false;
+  EXPECT_EQ(MakeDtmfAudioModemDecoder(off)->narrowband_excision(), nullptr);
 }
 
 TEST(AudioModemDecoderTest, TokensFailingTheCrcAreDropped) {

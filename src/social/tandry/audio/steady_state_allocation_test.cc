@@ -4,6 +4,7 @@
 // while a block is processed.
 
 #include <atomic>
+#include <cmath>
 #include <cstdint>
 #include <cstdlib>
 #include <memory>
@@ -59,10 +60,11 @@ void operator delete[](void* memory, std::size_t, std::align_val_t) noexcept { s
 namespace audio_modem {
 namespace {
 
-// `seconds` of a token played over and over in noise, as 16-bit samples.
+// `seconds` of a token played over and over in noise, as 16-bit samples;
+// with a steady tone of `tone_hz` (0: none) at about the token's level.
 std::vector<int16_t> Broadcast(const AudioModemEncoder& encoder,
                                const std::vector<uint8_t>& message, int crc_bytes, int rate,
-                               int seconds) {
+                               int seconds, double tone_hz = 0) {
   std::vector<float> token;
   encoder.Encode(message, &token, crc_bytes);
   std::vector<int16_t> pcm(static_cast<size_t>(rate) * seconds);
@@ -70,7 +72,9 @@ std::vector<int16_t> Broadcast(const AudioModemEncoder& encoder,
   for (size_t i = 0; i < pcm.size(); ++i) {
     seed = seed * 1664525u + 1013904223u;
     const float noise = (static_cast<float>(seed >> 8) / 16777216.0f - 0.5f) * 0.1f;
-    pcm[i] = audio_dsp::FloatToPcm16(0.5f * token[i % token.size()] + noise);
+    const float tone = static_cast<float>(
+        0.2 * std::sin(2 * 3.14159265358979 * tone_hz * static_cast<double>(i) / rate));
+    pcm[i] = audio_dsp::FloatToPcm16(0.5f * token[i % token.size()] + noise + tone);
   }
   return pcm;
 }
@@ -103,6 +107,35 @@ int64_t AllocationsWhileListening(AudioModemDecoder* decoder, const std::vector<
     }
   }
   return allocations;
+}
+
+// The same with a steady tone that the excision stage notches while the
+// blocks are counted.
+TEST(SteadyStateAllocationTest, NotchingTakesNoAllocationEither) {
+  DsssEncoderConfig dsss_encoder_config;
+  dsss_encoder_config.broadcast_sample_rate = 44100;
+  const std::unique_ptr<AudioModemEncoder> dsss = MakeDsssAudioModemEncoder(dsss_encoder_config);
+  DsssDecoderConfig dsss_config;
+  const std::unique_ptr<AudioModemDecoder> dsss_decoder = MakeDsssAudioModemDecoder(dsss_config);
+  int tokens = 0;
+  EXPECT_EQ(AllocationsWhileListening(dsss_decoder.get(),
+                                      Broadcast(*dsss, {1, 2, 3, 4, 5, 6}, 2, 44100, 12, 19000.0),
+                                      44100, 4, 6, 2, &tokens),
+            0);
+  EXPECT_TRUE(dsss_decoder->narrowband_excision()->filtering());
+  EXPECT_GT(tokens, 0);
+
+  const std::unique_ptr<AudioModemEncoder> dtmf = MakeDtmfAudioModemEncoder(DtmfEncoderConfig());
+  const std::unique_ptr<AudioModemDecoder> dtmf_decoder =
+      MakeDtmfAudioModemDecoder(DtmfDecoderConfig());
+  tokens = 0;
+  // Between the tones of 1244.5 and 1480 Hz.
+  EXPECT_EQ(AllocationsWhileListening(dtmf_decoder.get(),
+                                      Broadcast(*dtmf, {1, 2, 3, 4, 5}, 0, 44100, 12, 1350.0),
+                                      44100, 4, 5, 0, &tokens),
+            0);
+  EXPECT_TRUE(dtmf_decoder->narrowband_excision()->filtering());
+  EXPECT_GT(tokens, 0);
 }
 
 TEST(SteadyStateAllocationTest, DecodersTakeBlocksWithoutAllocating) {
