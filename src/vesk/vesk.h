@@ -51,11 +51,14 @@
 extern "C" {
 #endif
 
-/* The version of this header; vesk_version() gives the library's. */
+/* The version of this header; vesk_version() gives the library's. Before
+   1.0 a new minor version may add fields to the structs (0.3 added
+   vesk_decoder_options.narrowband_excision): build against the header of the
+   library you load. */
 #define VESK_VERSION_MAJOR 0
-#define VESK_VERSION_MINOR 2
+#define VESK_VERSION_MINOR 3
 #define VESK_VERSION_PATCH 0
-#define VESK_VERSION_STRING "0.2.0"
+#define VESK_VERSION_STRING "0.3.0"
 
 /* "MAJOR.MINOR.PATCH" of the library that is loaded. */
 VESK_API const char* vesk_version(void);
