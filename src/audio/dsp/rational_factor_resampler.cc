@@ -150,28 +150,38 @@ inline void DotGroup(const float* const* doubled_taps, const std::complex<float>
 
 // Four outputs side by side, lane j = Dot(taps, x_j, n) bit for bit: lane j
 // of taps[m] and x[m] holds the m-th tap and sample of output j, and the
-// products are summed in Dot's order (the zero starts of its partial sums
-// included, which decide the sign of a zero result).
+// products are summed in Dot's order. Dot's partial sums start from +0;
+// these start from their first product instead, which changes nothing but
+// the sign of a zero, and Dot never returns -0 (a zero sum that starts from
+// +0 is +0 in round-to-nearest), so a final + 0 restores it.
 inline __attribute__((always_inline)) Float4 DotLanes(const Float4* taps, const Float4* x, int n) {
   const Float4 zero = {0.0f, 0.0f, 0.0f, 0.0f};
   Float4 even[4], odd[4];  // Dot's acc0 and acc1, lane l of each in [l]
-#pragma GCC unroll 4
-  for (int l = 0; l < 4; ++l) even[l] = odd[l] = zero;
   int m = 0;
-  for (; m + 8 <= n; m += 8) {
+  if (n >= 8) {
 #pragma GCC unroll 4
     for (int l = 0; l < 4; ++l) {
-      even[l] += taps[m + l] * x[m + l];
-      odd[l] += taps[m + 4 + l] * x[m + 4 + l];
+      even[l] = taps[l] * x[l];
+      odd[l] = taps[4 + l] * x[4 + l];
     }
-  }
-  if (m + 4 <= n) {
+    for (m = 8; m + 8 <= n; m += 8) {
 #pragma GCC unroll 4
-    for (int l = 0; l < 4; ++l) odd[l] += taps[m + l] * x[m + l];
+      for (int l = 0; l < 4; ++l) {
+        even[l] += taps[m + l] * x[m + l];
+        odd[l] += taps[m + 4 + l] * x[m + 4 + l];
+      }
+    }
   }
   Float4 sums[4];
 #pragma GCC unroll 4
-  for (int l = 0; l < 4; ++l) sums[l] = even[l] + odd[l];
+  for (int l = 0; l < 4; ++l) {
+    if (m + 4 <= n) {
+      const Float4 last = taps[m + l] * x[m + l];
+      sums[l] = m > 0 ? even[l] + (odd[l] + last) : last;
+    } else {
+      sums[l] = m > 0 ? even[l] + odd[l] : zero;
+    }
+  }
   const int tail = n & ~3;
   Float4 rest = zero;
   switch (n - tail) {
@@ -185,7 +195,8 @@ inline __attribute__((always_inline)) Float4 DotLanes(const Float4* taps, const 
       rest = taps[tail] * x[tail];
       break;
   }
-  return ((sums[0] + sums[2]) + (sums[1] + sums[3])) + rest;
+  const Float4 sum = ((sums[0] + sums[2]) + (sums[1] + sums[3])) + rest;
+  return tail == n ? sum : sum + zero;
 }
 
 // What a four-lane group needs to know of the resampler.
