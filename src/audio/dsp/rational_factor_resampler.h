@@ -29,11 +29,13 @@ namespace audio_dsp {
 // Blocks may have any size, including 0; the concatenated output does not
 // depend on how the input stream is cut into blocks.
 //
-// Real streams long enough for 4 L outputs in one call (L = a multiple of q,
-// at least 32) are computed four outputs at a time, outputs k, k + L, k + 2L
-// and k + 3L side by side: they share a phase, so one tap vector serves all
-// four lanes, and each lane sums exactly as the one-output code does (the
-// output does not depend on which path computed it).
+// Real streams: where a call yields 4 L outputs or more (L the smallest
+// multiple of q that is at least 32, with L <= 1024 and tables of at most
+// 16384 four-lane taps and 4096 four-lane input samples), they are computed
+// four at a time, outputs k, k + L, k + 2L and k + 3L side by side: these
+// share a phase, so one tap vector serves all four lanes, and each lane sums
+// exactly as the one-output code does (the output does not depend on which
+// path computed it). 48 kHz to 44.1 kHz: q = 147, groups of 588 outputs.
 //
 // Allocation happens at construction; ProcessSamples() allocates only when
 // the output vector has to grow. Instantiated for T = float and
