@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstddef>
 
 #include "base/logging.h"
 
@@ -253,16 +254,14 @@ void NarrowbandExcision::UpdateLines() {
 }
 
 void NarrowbandExcision::SetNotch(int index, double frequency_hz) {
-  // H(z) = (1 + a) / 2 (1 - 2 c z^-1 + z^-2) / (1 - c (1 + a) z^-1 + a z^-2):
+  // H(z) = g (1 - 2 c z^-1 + z^-2) / (1 - 2 c g z^-1 + a z^-2), g = (1 + a) / 2:
   // zeros on the unit circle at the line, unity gain at 0 and the Nyquist
   // frequency, -3 dB points notch_bandwidth_hz apart (bilinear design).
   const double t = std::tan(kPi * params_.notch_bandwidth_hz / params_.sample_rate);
   const double a = (1.0 - t) / (1.0 + t);
   const double c = std::cos(2.0 * kPi * frequency_hz / params_.sample_rate);
   Notch& notch = notches_[index];
-  notch.b0 = (1.0 + a) / 2.0;
-  notch.b1 = -(1.0 + a) * c;
-  notch.b2 = notch.b0;
+  notch.gain = (1.0 + a) / 2.0;
   notch.a1 = -(1.0 + a) * c;
   notch.a2 = a;
 }
@@ -278,12 +277,18 @@ void NarrowbandExcision::Filter(float* samples, int count) {
       double* state = &state_[2 * (slot * channels + c)];
       double s1 = state[0], s2 = state[1];
       float* x = samples + c;
-      for (int i = 0; i < frames; ++i) {
-        const double in = x[i * channels];
-        const double out = n.b0 * in + s1;  // Transposed direct form II.
-        s1 = n.b1 * in - n.a1 * out + s2;
-        s2 = n.b2 * in - n.a2 * out;
-        x[i * channels] = static_cast<float>(out);
+      float* const end = x + static_cast<ptrdiff_t>(frames) * channels;
+      // Transposed direct form II. The numerator's taps are (gain, a1,
+      // gain): one product serves both outer taps, and the middle tap,
+      // equal to the denominator's a1, multiplies the difference of input
+      // and output. Three products per sample instead of five.
+      for (; x != end; x += channels) {
+        const double in = *x;
+        const double scaled = n.gain * in;
+        const double out = scaled + s1;
+        s1 = n.a1 * (in - out) + s2;
+        s2 = scaled - n.a2 * out;
+        *x = static_cast<float>(out);
       }
       state[0] = s1;
       state[1] = s2;

@@ -101,8 +101,10 @@ class NarrowbandExcision {
     int notch = -1;  // Index into notches_, or -1.
     bool matched = false;
   };
+  // Numerator gain * (1 - 2 c z^-1 + z^-2) = gain + a1 z^-1 + gain z^-2
+  // (a1 = -2 c gain), denominator 1 + a1 z^-1 + a2 z^-2.
   struct Notch {
-    double b0 = 1.0, b1 = 0.0, b2 = 0.0, a1 = 0.0, a2 = 0.0;
+    double gain = 1.0, a1 = 0.0, a2 = 0.0;
   };
   // A peak of the current spectrum that qualifies as a line.
   struct Peak {

@@ -85,6 +85,34 @@ TEST(NarrowbandExcisionTest, NotchesASteadyToneAndPassesTheRest) {
               -3.0, 0.5);
 }
 
+TEST(NarrowbandExcisionTest, NotchesALoudToneInTheAudibleBand) {
+  // A line among a receiver's tones near 1 kHz: the notch's poles lie close
+  // to z = 1, where a recursive filter is most sensitive to rounding.
+  NarrowbandExcisionParams params;
+  params.band_low_hz = 500;
+  params.band_high_hz = 3000;
+  NarrowbandExcision stage(params);
+  const double rate = 44100;
+  std::vector<float> x = Noise(6 * 44100, 30.0, 7);
+  AddTone(1203.3, 20000.0, rate, &x);
+  AddTone(1000.0, 5.0, rate, &x);  // Probes below line strength, as above.
+  AddTone(1203.3 - 15.0, 5.0, rate, &x);
+  const std::vector<float> y = Excise(&stage, x);
+  ASSERT_EQ(stage.NotchFrequencies().size(), 1u);
+  EXPECT_NEAR(stage.NotchFrequencies()[0], 1203.3, 0.3);
+  // The gains against the input without the tone, whose leakage would
+  // swamp the weak probes.
+  std::vector<float> rest = x;
+  AddTone(1203.3, -20000.0, rate, &rest);
+  const size_t begin = 2 * 44100, end = 6 * 44100;
+  EXPECT_LT(Amplitude(y, begin, end, 1203.3, rate) / 20000.0, 1e-2);
+  EXPECT_NEAR(Amplitude(y, begin, end, 1000.0, rate) / Amplitude(rest, begin, end, 1000.0, rate),
+              1.0, 0.02);
+  EXPECT_NEAR(20 * std::log10(Amplitude(y, begin, end, 1188.3, rate) /
+                              Amplitude(rest, begin, end, 1188.3, rate)),
+              -3.0, 0.5);
+}
+
 TEST(NarrowbandExcisionTest, NoiseAloneIsNeverTouched) {
   NarrowbandExcision stage(DsssBand(48000));
   const std::vector<float> x = Noise(60 * 48000, 1000.0, 2);

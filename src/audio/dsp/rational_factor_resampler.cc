@@ -5,6 +5,7 @@
 #include <complex>
 #include <cstdint>
 #include <cstring>
+#include <type_traits>
 #include <vector>
 
 #include "audio/dsp/number_util.h"
@@ -147,6 +148,99 @@ inline void DotGroup(const float* const* doubled_taps, const std::complex<float>
   Store4(reinterpret_cast<float*>(out), both);
 }
 
+// Four outputs side by side, lane j = Dot(taps, x_j, n) bit for bit: lane j
+// of taps[m] and x[m] holds the m-th tap and sample of output j, and the
+// products are summed in Dot's order. Dot's partial sums start from +0;
+// these start from their first product instead, which changes nothing but
+// the sign of a zero, and Dot never returns -0 (a zero sum that starts from
+// +0 is +0 in round-to-nearest), so a final + 0 restores it.
+inline __attribute__((always_inline)) Float4 DotLanes(const Float4* taps, const Float4* x, int n) {
+  const Float4 zero = {0.0f, 0.0f, 0.0f, 0.0f};
+  Float4 even[4], odd[4];  // Dot's acc0 and acc1, lane l of each in [l]
+  int m = 0;
+  if (n >= 8) {
+#pragma GCC unroll 4
+    for (int l = 0; l < 4; ++l) {
+      even[l] = taps[l] * x[l];
+      odd[l] = taps[4 + l] * x[4 + l];
+    }
+    for (m = 8; m + 8 <= n; m += 8) {
+#pragma GCC unroll 4
+      for (int l = 0; l < 4; ++l) {
+        even[l] += taps[m + l] * x[m + l];
+        odd[l] += taps[m + 4 + l] * x[m + 4 + l];
+      }
+    }
+  }
+  Float4 sums[4];
+#pragma GCC unroll 4
+  for (int l = 0; l < 4; ++l) {
+    if (m + 4 <= n) {
+      const Float4 last = taps[m + l] * x[m + l];
+      sums[l] = m > 0 ? even[l] + (odd[l] + last) : last;
+    } else {
+      sums[l] = m > 0 ? even[l] + odd[l] : zero;
+    }
+  }
+  const int tail = n & ~3;
+  Float4 rest = zero;
+  switch (n - tail) {
+    case 3:
+      rest = taps[tail] * x[tail] + (taps[tail + 1] * x[tail + 1] + taps[tail + 2] * x[tail + 2]);
+      break;
+    case 2:
+      rest = taps[tail] * x[tail] + taps[tail + 1] * x[tail + 1];
+      break;
+    case 1:
+      rest = taps[tail] * x[tail];
+      break;
+  }
+  const Float4 sum = ((sums[0] + sums[2]) + (sums[1] + sums[3])) + rest;
+  return tail == n ? sum : sum + zero;
+}
+
+// What a four-lane group needs to know of the resampler.
+struct LaneGeometry {
+  int num_taps = 0;
+  int step = 0;
+  int phase_increment = 0;
+  int denominator = 0;
+  int run = 0;  // outputs per lane
+};
+
+// Outputs i, i + run, i + 2 run and i + 3 run for i in [0, run), the first
+// window at lanes[0] with phase `phase`. kTaps is num_taps when known at
+// compile time, else 0.
+template <int kTaps>
+void LaneOutputs(const LaneGeometry& g, const Float4* taps, const Float4* lanes, int phase,
+                 float* out) {
+  const int num_taps = kTaps > 0 ? kTaps : g.num_taps;
+  const int run = g.run;
+  int s = 0;
+  for (int i = 0; i < run; ++i) {
+    const Float4 v = DotLanes(taps + phase * num_taps, lanes + s, num_taps);
+    out[i] = v[0];
+    out[i + run] = v[1];
+    out[i + 2 * run] = v[2];
+    out[i + 3 * run] = v[3];
+    s += g.step;
+    phase += g.phase_increment;
+    if (phase >= g.denominator) {
+      phase -= g.denominator;
+      ++s;
+    }
+  }
+}
+
+// Bounds of the four-lane path. A lane runs at least 32 outputs so that
+// interleaving the input (once per group) stays a small part of the work; the
+// caps keep the tables a few tens of kilobytes and a group within one
+// microphone block of a few thousand samples.
+constexpr int64_t kMinLaneRun = 32;          // outputs
+constexpr int64_t kMaxLaneRun = 1024;        // outputs
+constexpr int64_t kMaxLaneInput = 4096;      // interleaved input elements
+constexpr int64_t kMaxLaneTaps = 16 * 1024;  // four-lane tap vectors
+
 // Floats stored per tap: complex samples use duplicated taps. Outputs
 // computed side by side: as many as fill a vector.
 template <typename T>
@@ -184,6 +278,17 @@ RationalFactorResampler<T>::RationalFactorResampler(const ResamplingKernel& kern
     for (int m = 0; m < num_taps_; ++m) {
       const float value = static_cast<float>(kernel.Eval((radius_ - m) + phase_offset));
       for (int c = 0; c < kCopies; ++c) *tap++ = value;
+    }
+  }
+  if constexpr (std::is_same_v<T, float>) {
+    const int64_t run = denominator_ * ((kMinLaneRun + denominator_ - 1) / denominator_);
+    const int64_t stretch = run / denominator_ * numerator_ + num_taps_;
+    if (run <= kMaxLaneRun && stretch <= kMaxLaneInput &&
+        static_cast<int64_t>(filters_.size()) <= kMaxLaneTaps) {
+      lane_run_ = static_cast<int>(run);
+      lane_taps_.reserve(filters_.size());
+      for (const float t : filters_) lane_taps_.push_back(Float4{t, t, t, t});
+      lane_input_.resize(static_cast<size_t>(stretch));
     }
   }
   buffer_.reserve(2 * num_taps_);
@@ -242,7 +347,17 @@ void RationalFactorResampler<T>::ProcessSamples(const std::vector<T>& input,
       ++s;
     }
   }
-  // The windows wholly in the input, a group at a time, then one by one.
+  // The windows wholly in the input: lane groups (they end where they began
+  // in the phase cycle), then groups of neighbours, then one by one.
+  if constexpr (std::is_same_v<T, float>) {
+    if (lane_run_ > 0) {
+      const int64_t outputs = 4 * static_cast<int64_t>(lane_run_);
+      const int64_t advance = outputs / denominator_ * numerator_;  // input samples
+      for (; k + outputs <= count; k += outputs, s += advance) {
+        ProcessLaneGroup(input.data() + (s - num_buffered), phase, out + k);
+      }
+    }
+  }
   constexpr int kGroup = kGroupSize<T>;
   const float* group_taps[kGroup];
   const T* group_input[kGroup];
@@ -277,6 +392,46 @@ void RationalFactorResampler<T>::ProcessSamples(const std::vector<T>& input,
     buffer_.erase(buffer_.begin(), buffer_.begin() + s);
   } else {
     buffer_.assign(input.begin() + (s - num_buffered), input.end());
+  }
+}
+
+template <typename T>
+void RationalFactorResampler<T>::ProcessLaneGroup(const float* x, int phase, float* out) {
+  const int run = lane_run_;
+  const int lane_offset = run / denominator_ * numerator_;  // D, input samples
+  const float* x1 = x + lane_offset;
+  const float* x2 = x1 + lane_offset;
+  const float* x3 = x2 + lane_offset;
+  // The lane's window starts lie in [0, D], so its samples fit lane_input_.
+  const int span = (phase + (run - 1) * numerator_) / denominator_ + num_taps_;
+  Float4* lanes = lane_input_.data();
+  int u = 0;
+  for (; u + 4 <= span; u += 4) {
+    Float4 r[4] = {Load4(x + u), Load4(x1 + u), Load4(x2 + u), Load4(x3 + u)};
+    Transpose4(r);
+    for (int i = 0; i < 4; ++i) lanes[u + i] = r[i];
+  }
+  for (; u < span; ++u) lanes[u] = Float4{x[u], x1[u], x2[u], x3[u]};
+
+  LaneGeometry geometry;
+  geometry.num_taps = num_taps_;
+  geometry.step = step_;
+  geometry.phase_increment = phase_increment_;
+  geometry.denominator = denominator_;
+  geometry.run = run;
+  const Float4* taps = lane_taps_.data();
+  // The common tap counts get loops of known length (the accumulators then
+  // stay in registers): 11 taps when upsampling, 13 for 48 kHz to 44.1 kHz.
+  switch (num_taps_) {
+    case 11:
+      LaneOutputs<11>(geometry, taps, lanes, phase, out);
+      break;
+    case 13:
+      LaneOutputs<13>(geometry, taps, lanes, phase, out);
+      break;
+    default:
+      LaneOutputs<0>(geometry, taps, lanes, phase, out);
+      break;
   }
 }
 

@@ -8,6 +8,7 @@
 
 #include "audio/dsp/resampler.h"
 #include "audio/dsp/resampling_kernel.h"
+#include "audio/dsp/simd.h"
 
 namespace audio_dsp {
 
@@ -27,6 +28,14 @@ namespace audio_dsp {
 //
 // Blocks may have any size, including 0; the concatenated output does not
 // depend on how the input stream is cut into blocks.
+//
+// Real streams: where a call yields 4 L outputs or more (L the smallest
+// multiple of q that is at least 32, with L <= 1024 and tables of at most
+// 16384 four-lane taps and 4096 four-lane input samples), they are computed
+// four at a time, outputs k, k + L, k + 2L and k + 3L side by side: these
+// share a phase, so one tap vector serves all four lanes, and each lane sums
+// exactly as the one-output code does (the output does not depend on which
+// path computed it). 48 kHz to 44.1 kHz: q = 147, groups of 588 outputs.
 //
 // Allocation happens at construction; ProcessSamples() allocates only when
 // the output vector has to grow. Instantiated for T = float and
@@ -78,6 +87,17 @@ class RationalFactorResampler : public Resampler<T> {
   std::vector<T> buffer_;
   int phase_ = 0;  // 0 to q - 1
   std::vector<T> flush_zeros_;
+  // The four-lane path (real T only; empty and lane_run_ 0 otherwise):
+  // lane_run_ = L outputs per lane, every tap of filters_ repeated in all four
+  // lanes, and room for the four interleaved input stretches of one group of
+  // 4 L outputs (element u: input u, u + D, u + 2D, u + 3D with D = L p / q).
+  int lane_run_ = 0;
+  std::vector<Float4> lane_taps_;
+  std::vector<Float4> lane_input_;
+
+  // Computes the group of 4 lane_run_ outputs starting at `out` whose first
+  // window starts at `x` with phase `phase`.
+  void ProcessLaneGroup(const float* x, int phase, float* out);
 };
 
 extern template class RationalFactorResampler<float>;
