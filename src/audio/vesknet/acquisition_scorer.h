@@ -14,9 +14,12 @@
 // Cost: per position, one pass over the frame (F multiply-adds per part) for
 // twelve positions at a time, their chunk correlations held in four-lane
 // vectors whose lanes are positions, and one pass over the chunks per pair of
-// opposite shifts (a shift and its mirror share their products). The
-// broadcaster score costs nothing per position; a request adds up the
-// detection window's energies, four shifts per vector.
+// opposite shifts (a shift and its mirror share their products). On x86
+// processors with AVX the same loops run on eight-lane vectors, 24 positions
+// at a time; every lane performs the same operations in the same order
+// either way, so the scores are bit-identical. The broadcaster score costs
+// nothing per position; a request adds up the detection window's energies,
+// four shifts per vector.
 //
 // Not thread-safe. Allocates at construction and when an input block is
 // larger than every earlier one; otherwise ComputeScores does not allocate
@@ -34,6 +37,15 @@ namespace audio_vesknet {
 
 class AcquisitionScorer {
  public:
+  // Vector width of the per-position loops.
+  enum class Kernel {
+    kWidest,    // Eight lanes where the processor runs AVX, else four.
+    kFourLane,  // Four lanes (SSE on x86, NEON on ARM, scalar elsewhere).
+  };
+
+  // Whether this processor runs the eight-lane kernel.
+  static bool EightLaneKernelAvailable();
+
   // Floats of energy history that a scorer of these arguments keeps (the
   // bulk of its memory), without building it. Arguments as the constructor's;
   // frame_size F > 0, num_shifts S > 0.
@@ -46,8 +58,10 @@ class AcquisitionScorer {
   // noise_length: N > 0, the background smoother's effective length in positions.
   // detection_window: positions integrated by GetBroadcasterScore (raised to
   //   at least 2F - 1).
+  // kernel: the vector width (the scores do not depend on it).
   AcquisitionScorer(const std::vector<float>& reference, const std::vector<float>& doppler_shifts,
-                    int num_chunks, float noise_length, int detection_window);
+                    int num_chunks, float noise_length, int detection_window,
+                    Kernel kernel = Kernel::kWidest);
 
   // Forgets all input and history.
   void Reset();
@@ -82,12 +96,14 @@ class AcquisitionScorer {
   int detection_num_frames() const { return detection_num_frames_; }
   int detection_num_shifts() const { return detection_num_shifts_; }
   int64_t positions_scored() const { return positions_scored_; }
+  // Positions scored together: 12 (four-lane kernel) or 24 (eight-lane).
+  int lanes() const { return lanes_; }
 
  private:
-  // Positions scored together, one per vector lane (three four-lane vectors
-  // per part: with their accumulators, the reference value and a load they
-  // fill the eight vector registers of 32-bit x86).
-  static constexpr int kLanes = 12;
+  // Positions scored together, one per vector lane: three vectors per part
+  // (with their accumulators, the reference value and a load they fill the
+  // eight vector registers of 32-bit x86), of four or eight lanes.
+  static constexpr int kMaxLanes = 24;
 
   // A Doppler shift, and the shift whose phasors are its exact conjugates
   // (-1 when the list has none): the two energies come from the same four
@@ -99,12 +115,19 @@ class AcquisitionScorer {
 
   // Shift energies of the frame at real[0 .. F), imag[0 .. F), directly.
   void ScorePointers(const float* real, const float* imag, float* shift_scores) const;
-  // Shift energies of the `count` (<= kLanes) positions starting at `real`
+  // Shift energies of the `count` (<= lanes_) positions starting at `real`
   // and `imag` into the history, for the positions from positions_scored_
   // on, with each one's largest energy and its energies' sum into
-  // block_best_ and block_sum_. Reads kLanes - 1 + F samples of each part
+  // block_best_ and block_sum_. Reads lanes_ - 1 + F samples of each part
   // whatever the count.
   void ScoreBlock(const float* real, const float* imag, int count);
+  // The vector part of ScoreBlock for `Vector` (four or eight floats): the
+  // energies of all lanes_ positions into block_energies_, each one's
+  // largest into block_best_ and their sum into block_sum_.
+  template <typename Vector>
+  void ScoreLanes(const float* real, const float* imag);
+  void ScoreLanesFour(const float* real, const float* imag);
+  void ScoreLanesEight(const float* real, const float* imag);
   // Background and output of the next position, whose largest energy and
   // energy sum are given; counts the position.
   void FinishPosition(float best, double sum, std::vector<float>* acquisition_scores);
@@ -122,13 +145,14 @@ class AcquisitionScorer {
   int num_chunks_;
   int chunk_length_;
   int row_stride_;  // S rounded up to a multiple of 16.
+  int lanes_;       // 12 or 24.
   std::vector<float> reference_;
   // Phasor of shift s at chunk k: (phasor_real_, phasor_imag_)[s * C + k].
   std::vector<float> phasor_real_;
   std::vector<float> phasor_imag_;
   std::vector<ShiftTerm> terms_;
-  // The phasors of terms_[t] at chunk k, each four times (real, then
-  // imaginary): 8 floats at (t * C + k) * 8.
+  // The phasors of terms_[t] at chunk k, each once per vector lane (real,
+  // then imaginary): 2W floats at (t * C + k) * 2W for W-lane vectors.
   std::vector<float> term_phasors_;
   int detection_span_;
   int detection_num_frames_;
@@ -138,7 +162,7 @@ class AcquisitionScorer {
   int warm_up_;
 
   // Streaming state.
-  // Samples not yet consumed, [0, buffered_), followed by kLanes - 1 zeros
+  // Samples not yet consumed, [0, buffered_), followed by lanes_ - 1 zeros
   // that a last, partial block reads.
   std::vector<float> reader_real_;
   std::vector<float> reader_imag_;
@@ -152,13 +176,13 @@ class AcquisitionScorer {
   // Each position's largest energy, for its output D positions later.
   CircularArray<float> best_energy_;
   int64_t positions_scored_ = 0;
-  // Per-block scratch: chunk correlations (C x kLanes, lanes innermost),
-  // energies (S x kLanes) and each lane's largest energy and energy sum.
+  // Per-block scratch: chunk correlations (C x lanes_, lanes innermost),
+  // energies (S x lanes_) and each lane's largest energy and energy sum.
   std::vector<float> chunk_real_;
   std::vector<float> chunk_imag_;
   std::vector<float> block_energies_;
-  float block_best_[kLanes];
-  double block_sum_[kLanes];
+  float block_best_[kMaxLanes];
+  double block_sum_[kMaxLanes];
 };
 
 }  // namespace audio_vesknet
