@@ -14,20 +14,22 @@
 // Some checks compare a vector's size with an int member, as their texts read.
 #pragma GCC diagnostic ignored "-Wsign-compare"
 
-// Eight-lane vectors through a function compiled for AVX, chosen at run time.
+// Eight- and sixteen-lane vectors through functions compiled for AVX and
+// AVX-512, chosen at run time.
 #if defined(__x86_64__) || defined(__i386__)
-#define VESK_EIGHT_LANE_KERNEL 1
+#define VESK_WIDE_KERNELS 1
 #endif
 
 namespace audio_vesknet {
 namespace {
 
 typedef float Float8 __attribute__((vector_size(32)));
+typedef float Float16 __attribute__((vector_size(64)));
 
 // Unaligned loads and stores of a vector of any width, inlined into the
-// kernel that uses them (so that the eight-lane ones are compiled for AVX;
-// vectors pass by reference, as eight-lane values cannot cross into code
-// compiled without AVX).
+// kernel that uses them (so that the wide ones are compiled for AVX or
+// AVX-512; vectors pass by reference, as wide values cannot cross into code
+// compiled without those).
 template <typename Vector>
 inline __attribute__((always_inline)) void LoadVector(const float* p, Vector* v) {
   std::memcpy(v, p, sizeof(*v));
@@ -79,7 +81,15 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
   CHECK(num_shifts_ > 0);
   chunk_length_ = (frame_size_ + num_chunks_ - 1) / num_chunks_;
   row_stride_ = RowStride(num_shifts_);
-  lanes_ = kernel == Kernel::kWidest && EightLaneKernelAvailable() ? 24 : 12;
+  if (kernel == Kernel::kWidest) {
+    kernel = KernelAvailable(Kernel::kSixteenLane) ? Kernel::kSixteenLane
+             : KernelAvailable(Kernel::kEightLane) ? Kernel::kEightLane
+                                                   : Kernel::kFourLane;
+  }
+  lanes_ = !KernelAvailable(kernel)         ? 12
+           : kernel == Kernel::kSixteenLane ? 48
+           : kernel == Kernel::kEightLane   ? 24
+                                            : 12;
   const int width = lanes_ / 3;
 
   // MakePhasorMatrix builds shifts x chunks; row s is this shift's phasor
@@ -286,25 +296,47 @@ void AcquisitionScorer::ScoreLanesFour(const float* real, const float* imag) {
   ScoreLanes<audio_dsp::Float4>(real, imag);
 }
 
-#ifdef VESK_EIGHT_LANE_KERNEL
-// Compiled for AVX alone (no FMA, which would round differently), called only
-// where the processor has it.
+#ifdef VESK_WIDE_KERNELS
+// Compiled for AVX or AVX-512 alone (no FMA, which would round differently),
+// called only where the processor has it.
 __attribute__((target("avx"))) void AcquisitionScorer::ScoreLanesEight(const float* real,
                                                                        const float* imag) {
   ScoreLanes<Float8>(real, imag);
 }
 
-bool AcquisitionScorer::EightLaneKernelAvailable() { return __builtin_cpu_supports("avx"); }
+__attribute__((target("avx512f"))) void AcquisitionScorer::ScoreLanesSixteen(const float* real,
+                                                                             const float* imag) {
+  ScoreLanes<Float16>(real, imag);
+}
+
+bool AcquisitionScorer::KernelAvailable(Kernel kernel) {
+  switch (kernel) {
+    case Kernel::kEightLane:
+      return __builtin_cpu_supports("avx");
+    case Kernel::kSixteenLane:
+      return __builtin_cpu_supports("avx512f");
+    default:
+      return true;
+  }
+}
 #else
 void AcquisitionScorer::ScoreLanesEight(const float* real, const float* imag) {
   ScoreLanesFour(real, imag);
 }
 
-bool AcquisitionScorer::EightLaneKernelAvailable() { return false; }
+void AcquisitionScorer::ScoreLanesSixteen(const float* real, const float* imag) {
+  ScoreLanesFour(real, imag);
+}
+
+bool AcquisitionScorer::KernelAvailable(Kernel kernel) {
+  return kernel == Kernel::kWidest || kernel == Kernel::kFourLane;
+}
 #endif
 
 void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int count) {
-  if (lanes_ == 24) {
+  if (lanes_ == 48) {
+    ScoreLanesSixteen(real, imag);
+  } else if (lanes_ == 24) {
     ScoreLanesEight(real, imag);
   } else {
     ScoreLanesFour(real, imag);

@@ -15,9 +15,10 @@
 // twelve positions at a time, their chunk correlations held in four-lane
 // vectors whose lanes are positions, and one pass over the chunks per pair of
 // opposite shifts (a shift and its mirror share their products). On x86
-// processors with AVX the same loops run on eight-lane vectors, 24 positions
-// at a time; every lane performs the same operations in the same order
-// either way, so the scores are bit-identical. The broadcaster score costs
+// processors with AVX the same loops run on eight-lane vectors (24 positions
+// at a time), with AVX-512 on sixteen-lane ones (48); every lane performs the
+// same operations in the same order whatever the width, so the scores are
+// bit-identical. The broadcaster score costs
 // nothing per position; a request adds up the detection window's energies,
 // four shifts per vector.
 //
@@ -37,14 +38,16 @@ namespace audio_vesknet {
 
 class AcquisitionScorer {
  public:
-  // Vector width of the per-position loops.
+  // Vector width of the per-position loops (the scores do not depend on it).
   enum class Kernel {
-    kWidest,    // Eight lanes where the processor runs AVX, else four.
-    kFourLane,  // Four lanes (SSE on x86, NEON on ARM, scalar elsewhere).
+    kWidest,       // The widest of the three below that the processor runs.
+    kFourLane,     // SSE on x86, NEON on ARM, scalar code elsewhere.
+    kEightLane,    // AVX (x86 only).
+    kSixteenLane,  // AVX-512 (x86 only).
   };
 
-  // Whether this processor runs the eight-lane kernel.
-  static bool EightLaneKernelAvailable();
+  // Whether this processor runs `kernel` (kWidest and kFourLane always).
+  static bool KernelAvailable(Kernel kernel);
 
   // Floats of energy history that a scorer of these arguments keeps (the
   // bulk of its memory), without building it. Arguments as the constructor's;
@@ -58,7 +61,8 @@ class AcquisitionScorer {
   // noise_length: N > 0, the background smoother's effective length in positions.
   // detection_window: positions integrated by GetBroadcasterScore (raised to
   //   at least 2F - 1).
-  // kernel: the vector width (the scores do not depend on it).
+  // kernel: the vector width; one the processor lacks falls back to four
+  //   lanes.
   AcquisitionScorer(const std::vector<float>& reference, const std::vector<float>& doppler_shifts,
                     int num_chunks, float noise_length, int detection_window,
                     Kernel kernel = Kernel::kWidest);
@@ -96,14 +100,14 @@ class AcquisitionScorer {
   int detection_num_frames() const { return detection_num_frames_; }
   int detection_num_shifts() const { return detection_num_shifts_; }
   int64_t positions_scored() const { return positions_scored_; }
-  // Positions scored together: 12 (four-lane kernel) or 24 (eight-lane).
+  // Positions scored together: 12, 24 or 48 (four, eight or sixteen lanes).
   int lanes() const { return lanes_; }
 
  private:
   // Positions scored together, one per vector lane: three vectors per part
   // (with their accumulators, the reference value and a load they fill the
-  // eight vector registers of 32-bit x86), of four or eight lanes.
-  static constexpr int kMaxLanes = 24;
+  // eight vector registers of 32-bit x86), of four, eight or sixteen lanes.
+  static constexpr int kMaxLanes = 48;
 
   // A Doppler shift, and the shift whose phasors are its exact conjugates
   // (-1 when the list has none): the two energies come from the same four
@@ -121,13 +125,14 @@ class AcquisitionScorer {
   // block_best_ and block_sum_. Reads lanes_ - 1 + F samples of each part
   // whatever the count.
   void ScoreBlock(const float* real, const float* imag, int count);
-  // The vector part of ScoreBlock for `Vector` (four or eight floats): the
+  // The vector part of ScoreBlock for `Vector` (4, 8 or 16 floats): the
   // energies of all lanes_ positions into block_energies_, each one's
   // largest into block_best_ and their sum into block_sum_.
   template <typename Vector>
   void ScoreLanes(const float* real, const float* imag);
   void ScoreLanesFour(const float* real, const float* imag);
   void ScoreLanesEight(const float* real, const float* imag);
+  void ScoreLanesSixteen(const float* real, const float* imag);
   // Background and output of the next position, whose largest energy and
   // energy sum are given; counts the position.
   void FinishPosition(float best, double sum, std::vector<float>* acquisition_scores);
@@ -145,7 +150,7 @@ class AcquisitionScorer {
   int num_chunks_;
   int chunk_length_;
   int row_stride_;  // S rounded up to a multiple of 16.
-  int lanes_;       // 12 or 24.
+  int lanes_;       // 12, 24 or 48.
   std::vector<float> reference_;
   // Phasor of shift s at chunk k: (phasor_real_, phasor_imag_)[s * C + k].
   std::vector<float> phasor_real_;

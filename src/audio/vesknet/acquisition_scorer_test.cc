@@ -133,11 +133,18 @@ Signal MakeSignal(const std::vector<float>& code, int length, const std::vector<
 }
 
 TEST(AcquisitionScorerTest, KernelWidthFollowsTheProcessor) {
+  using Kernel = AcquisitionScorer::Kernel;
   const std::vector<float> code = Code(5);
-  const AcquisitionScorer widest(code, kShifts, 4, 20.0f, 100);
-  EXPECT_EQ(widest.lanes(), AcquisitionScorer::EightLaneKernelAvailable() ? 24 : 12);
-  const AcquisitionScorer four(code, kShifts, 4, 20.0f, 100, AcquisitionScorer::Kernel::kFourLane);
-  EXPECT_EQ(four.lanes(), 12);
+  const auto lanes = [&](Kernel kernel) {
+    return AcquisitionScorer(code, kShifts, 4, 20.0f, 100, kernel).lanes();
+  };
+  EXPECT_EQ(lanes(Kernel::kFourLane), 12);
+  EXPECT_EQ(lanes(Kernel::kEightLane),
+            AcquisitionScorer::KernelAvailable(Kernel::kEightLane) ? 24 : 12);
+  EXPECT_EQ(lanes(Kernel::kSixteenLane),
+            AcquisitionScorer::KernelAvailable(Kernel::kSixteenLane) ? 48 : 12);
+  EXPECT_EQ(lanes(Kernel::kWidest),
+            std::max(lanes(Kernel::kEightLane), lanes(Kernel::kSixteenLane)));
 }
 
 TEST(AcquisitionScorerTest, GeometryFollowsTheConfiguration) {
@@ -246,11 +253,16 @@ TEST(AcquisitionScorerTest, EqualsTheDirectComputation) {
     std::vector<int> starts;
     for (int start = 3 * f + 5; start < 20 * f; start += f) starts.push_back(start);
     const Signal signal = MakeSignal(code, 25 * f, starts, c.cycles_per_frame, 0.5f, 11);
+    // The widest kernel against the direct form, the others against it.
     AcquisitionScorer scorer(code, c.shifts, c.num_chunks, 20.0f, 4 * f);
-    AcquisitionScorer four_lane(code, c.shifts, c.num_chunks, 20.0f, 4 * f,
-                                AcquisitionScorer::Kernel::kFourLane);
+    using Kernel = AcquisitionScorer::Kernel;
+    std::vector<AcquisitionScorer> narrower;
+    for (const Kernel kernel : {Kernel::kFourLane, Kernel::kEightLane}) {
+      narrower.emplace_back(code, c.shifts, c.num_chunks, 20.0f, 4 * f, kernel);
+    }
     DirectScorer direct(code, c.shifts, c.num_chunks, 20.0f, 4 * f);
-    std::vector<float> got, got_four_lane, want, scores;
+    std::vector<float> got, want, scores;
+    std::vector<std::vector<float>> got_narrower(narrower.size());
     std::uniform_int_distribution<int> block(1, 3 * f);
     for (size_t start = 0; start < signal.real.size();) {
       const size_t end = std::min(signal.real.size(), start + block(rng));
@@ -258,16 +270,18 @@ TEST(AcquisitionScorerTest, EqualsTheDirectComputation) {
       const std::vector<float> imag(signal.imag.begin() + start, signal.imag.begin() + end);
       scorer.ComputeScores(real, imag, &scores);
       got.insert(got.end(), scores.begin(), scores.end());
-      four_lane.ComputeScores(real, imag, &scores);
-      got_four_lane.insert(got_four_lane.end(), scores.begin(), scores.end());
+      for (size_t i = 0; i < narrower.size(); ++i) {
+        narrower[i].ComputeScores(real, imag, &scores);
+        got_narrower[i].insert(got_narrower[i].end(), scores.begin(), scores.end());
+        EXPECT_EQ(narrower[i].GetBroadcasterScore(true), scorer.GetBroadcasterScore(true));
+      }
       direct.Add(real, imag, &want);
       const float broadcaster = direct.BroadcasterScore();
       EXPECT_NEAR(scorer.GetBroadcasterScore(true), broadcaster, 1e-5f * broadcaster) << c.taps;
-      EXPECT_EQ(four_lane.GetBroadcasterScore(true), scorer.GetBroadcasterScore(true));
       start = end;
     }
     // The vector width changes nothing, to the bit.
-    EXPECT_EQ(got_four_lane, got) << c.taps;
+    for (const std::vector<float>& other : got_narrower) EXPECT_EQ(other, got) << c.taps;
     ASSERT_EQ(got.size(), want.size());
     EXPECT_GT(*std::max_element(want.begin(), want.end()), 5.0f);  // The frames stand out.
     // Scores are ratios to a background near 1: below 0.01 only the absolute
