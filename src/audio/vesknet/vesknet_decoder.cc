@@ -482,12 +482,17 @@ void VesknetDecoder::GroupCandidateStarts() {
   const int n = smoothed_.size();
   for (int i = 0; i < n;) {
     // Smoothed scores are 0 or above the threshold, so a zero bit pattern is
-    // a zero score: skip them eight at a time.
-    uint64_t bits[4];
-    if (i + 8 <= n && (std::memcpy(bits, smoothed + i, sizeof(bits)),
-                       (bits[0] | bits[1] | bits[2] | bits[3]) == 0)) {
-      i += 8;
-      continue;
+    // a zero score: skip them eight at a time (in 32-bit words, which the
+    // 32-bit build keeps in its registers).
+    if (i + 8 <= n) {
+      uint32_t bits[8];
+      std::memcpy(bits, smoothed + i, sizeof(bits));
+      uint32_t any = 0;
+      for (const uint32_t word : bits) any |= word;
+      if (any == 0) {
+        i += 8;
+        continue;
+      }
     }
     if (!(smoothed[i] > 0.0f)) {
       ++i;
