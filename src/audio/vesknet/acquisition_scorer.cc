@@ -348,33 +348,39 @@ void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int cou
   }
 }
 
-void AcquisitionScorer::FinishPosition(float best, double sum,
-                                       std::vector<float>* acquisition_scores) {
-  const int64_t n = positions_scored_;
-  best_energy_[n] = best;
-  if (n == warm_up_ - 1) {
-    // Start the background at the mean of the first positions rather than
-    // at zero, so that early scores are not inflated.
-    double warm_sum = 0.0;
-    for (int64_t p = 0; p < warm_up_; ++p) {
-      const float* energies = Energies(p);
-      for (int s = 0; s < num_shifts_; ++s) warm_sum += energies[s];
+void AcquisitionScorer::FinishBlock(int count, std::vector<float>* acquisition_scores) {
+  // The smoother's state and the position count live in locals across the
+  // block, so that the chain of dependent operations stays in registers.
+  double state1 = noise_state1_, state2 = noise_state2_;
+  int64_t n = positions_scored_;
+  for (int lane = 0; lane < count; ++lane, ++n) {
+    best_energy_[n] = block_best_[lane];
+    if (n == warm_up_ - 1) {
+      // Start the background at the mean of the first positions rather than
+      // at zero, so that early scores are not inflated.
+      double warm_sum = 0.0;
+      for (int64_t p = 0; p < warm_up_; ++p) {
+        const float* energies = Energies(p);
+        for (int s = 0; s < num_shifts_; ++s) warm_sum += energies[s];
+      }
+      state1 = state2 = warm_sum / (static_cast<double>(warm_up_) * num_shifts_);
+    } else if (n > warm_up_ - 1) {
+      const double mean = block_sum_[lane] / num_shifts_;
+      state1 += noise_weight_ * (mean - state1);
+      state2 += noise_weight_ * (state1 - state2);
     }
-    noise_state1_ = noise_state2_ = warm_sum / (static_cast<double>(warm_up_) * num_shifts_);
-  } else if (n > warm_up_ - 1) {
-    const double mean = sum / num_shifts_;
-    noise_state1_ += noise_weight_ * (mean - noise_state1_);
-    noise_state2_ += noise_weight_ * (noise_state1_ - noise_state2_);
-  }
-  ++positions_scored_;
-  // Position n - D is the one whose background the smoother now stands for.
-  if (positions_scored_ > noise_delay_) {
-    float output = 0.0f;
-    if (n >= warm_up_ - 1) {
-      output = static_cast<float>(best_energy_[n - noise_delay_] / (noise_state2_ + 1e-12));
+    // Position n - D is the one whose background the smoother now stands for.
+    if (n + 1 > noise_delay_) {
+      float output = 0.0f;
+      if (n >= warm_up_ - 1) {
+        output = static_cast<float>(best_energy_[n - noise_delay_] / (state2 + 1e-12));
+      }
+      acquisition_scores->push_back(output);
     }
-    acquisition_scores->push_back(output);
   }
+  noise_state1_ = state1;
+  noise_state2_ = state2;
+  positions_scored_ = n;
 }
 
 void AcquisitionScorer::ComputeScores(const std::vector<float>& baseband_real_signal,
@@ -412,9 +418,7 @@ void AcquisitionScorer::ComputeScores(const float* baseband_real_signal,
   for (int start = 0; start < positions; start += lanes_) {
     const int lanes = std::min(lanes_, positions - start);
     ScoreBlock(reader_real_.data() + start, reader_imag_.data() + start, lanes);
-    for (int lane = 0; lane < lanes; ++lane) {
-      FinishPosition(block_best_[lane], block_sum_[lane], acquisition_scores);
-    }
+    FinishBlock(lanes, acquisition_scores);
   }
   // Consumed samples go in bulk, so each sample is moved about once.
   if (positions > 0) {

@@ -133,9 +133,9 @@ class AcquisitionScorer {
   void ScoreLanesFour(const float* real, const float* imag);
   void ScoreLanesEight(const float* real, const float* imag);
   void ScoreLanesSixteen(const float* real, const float* imag);
-  // Background and output of the next position, whose largest energy and
-  // energy sum are given; counts the position.
-  void FinishPosition(float best, double sum, std::vector<float>* acquisition_scores);
+  // Background and output of the next `count` positions, whose largest
+  // energies and energy sums are in block_best_ and block_sum_; counts them.
+  void FinishBlock(int count, std::vector<float>* acquisition_scores);
   // The S energies of `position` in the history (row_stride_ floats, the
   // ones beyond S being 0).
   float* Energies(int64_t position) {
