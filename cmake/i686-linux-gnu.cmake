@@ -6,7 +6,10 @@ set(CMAKE_SYSTEM_PROCESSOR i686)
 set(CMAKE_C_COMPILER gcc)
 set(CMAKE_CXX_COMPILER g++)
 set(CMAKE_LIBRARY_ARCHITECTURE i386-linux-gnu)
-set(_vesk_i686_flags "-m32 -march=i686 -mssse3 -mfpmath=sse")
+# Tuned for current processors as the NDK's clang does by default: with
+# -march=i686 alone GCC also tunes for the Pentium Pro and splits every
+# unaligned vector load in two (the DSSS decoder ran 20-25% slower).
+set(_vesk_i686_flags "-m32 -march=i686 -mssse3 -mfpmath=sse -mtune=generic")
 set(CMAKE_C_FLAGS_INIT "${_vesk_i686_flags}")
 set(CMAKE_CXX_FLAGS_INIT "${_vesk_i686_flags}")
 set(CMAKE_EXE_LINKER_FLAGS_INIT "-m32")

@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # Builds and runs every test of the project:
 #   host     x86-64: the C++ suites and the JUnit suites through a real JVM;
-#   i686     32-bit x86 (-m32 -march=i686 -mssse3 -mfpmath=sse), the stand-in
+#   i686     32-bit x86 (-m32 -march=i686 -mssse3 -mfpmath=sse, tuned generic), the stand-in
 #            for the Android x86 ABI: the C++ suites;
 #   sanitize x86-64 under AddressSanitizer and UndefinedBehaviorSanitizer:
 #            the C++ suites;

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <complex>
+#include <cstring>
 
 #include "audio/dsp/matrix.h"
 #include "audio/dsp/number_util.h"
@@ -13,8 +14,30 @@
 // Some checks compare a vector's size with an int member, as their texts read.
 #pragma GCC diagnostic ignored "-Wsign-compare"
 
+// Eight- and sixteen-lane vectors through functions compiled for AVX and
+// AVX-512, chosen at run time.
+#if defined(__x86_64__) || defined(__i386__)
+#define VESK_WIDE_KERNELS 1
+#endif
+
 namespace audio_vesknet {
 namespace {
+
+typedef float Float8 __attribute__((vector_size(32)));
+typedef float Float16 __attribute__((vector_size(64)));
+
+// Unaligned loads and stores of a vector of any width, inlined into the
+// kernel that uses them (so that the wide ones are compiled for AVX or
+// AVX-512; vectors pass by reference, as wide values cannot cross into code
+// compiled without those).
+template <typename Vector>
+inline __attribute__((always_inline)) void LoadVector(const float* p, Vector* v) {
+  std::memcpy(v, p, sizeof(*v));
+}
+template <typename Vector>
+inline __attribute__((always_inline)) void StoreVector(float* p, const Vector& v) {
+  std::memcpy(p, &v, sizeof(v));
+}
 
 int HistorySize(int delay, int span, int warm_up) {
   return std::max(std::max(delay + 1, span), warm_up);
@@ -47,7 +70,7 @@ int64_t AcquisitionScorer::HistoryFloats(int frame_size, int num_shifts, float n
 
 AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
                                      const std::vector<float>& doppler_shifts, int num_chunks,
-                                     float noise_length, int detection_window)
+                                     float noise_length, int detection_window, Kernel kernel)
     : frame_size_(static_cast<int>(reference.size())),
       num_shifts_(static_cast<int>(doppler_shifts.size())),
       num_chunks_(num_chunks),
@@ -58,6 +81,16 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
   CHECK(num_shifts_ > 0);
   chunk_length_ = (frame_size_ + num_chunks_ - 1) / num_chunks_;
   row_stride_ = RowStride(num_shifts_);
+  if (kernel == Kernel::kWidest) {
+    kernel = KernelAvailable(Kernel::kSixteenLane) ? Kernel::kSixteenLane
+             : KernelAvailable(Kernel::kEightLane) ? Kernel::kEightLane
+                                                   : Kernel::kFourLane;
+  }
+  lanes_ = !KernelAvailable(kernel)         ? 12
+           : kernel == Kernel::kSixteenLane ? 48
+           : kernel == Kernel::kEightLane   ? 24
+                                            : 12;
+  const int width = lanes_ / 3;
 
   // MakePhasorMatrix builds shifts x chunks; row s is this shift's phasor
   // over the chunks.
@@ -90,12 +123,13 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
     if (mirror >= 0) paired[mirror] = true;
     terms_.push_back({s, mirror});
   }
-  term_phasors_.resize(terms_.size() * num_chunks_ * 8);
+  term_phasors_.resize(terms_.size() * num_chunks_ * 2 * width);
   for (size_t t = 0; t < terms_.size(); ++t) {
     for (int k = 0; k < num_chunks_; ++k) {
-      float* phasor = term_phasors_.data() + (t * num_chunks_ + k) * 8;
-      std::fill(phasor, phasor + 4, phasor_real_[terms_[t].shift * num_chunks_ + k]);
-      std::fill(phasor + 4, phasor + 8, phasor_imag_[terms_[t].shift * num_chunks_ + k]);
+      float* phasor = term_phasors_.data() + (t * num_chunks_ + k) * 2 * width;
+      std::fill(phasor, phasor + width, phasor_real_[terms_[t].shift * num_chunks_ + k]);
+      std::fill(phasor + width, phasor + 2 * width,
+                phasor_imag_[terms_[t].shift * num_chunks_ + k]);
     }
   }
 
@@ -116,16 +150,16 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
   energies_.resize(static_cast<size_t>(history) * row_stride_);
   energies_mask_ = history - 1;
   best_energy_ = CircularArray<float>(noise_delay_ + 1);
-  chunk_real_.resize(num_chunks_ * kLanes);
-  chunk_imag_.resize(num_chunks_ * kLanes);
-  block_energies_.resize(num_shifts_ * kLanes);
+  chunk_real_.resize(num_chunks_ * lanes_);
+  chunk_imag_.resize(num_chunks_ * lanes_);
+  block_energies_.resize(num_shifts_ * lanes_);
   Reset();
 }
 
 void AcquisitionScorer::Reset() {
   buffered_ = 0;
-  reader_real_.assign(kLanes - 1, 0.0f);
-  reader_imag_.assign(kLanes - 1, 0.0f);
+  reader_real_.assign(lanes_ - 1, 0.0f);
+  reader_imag_.assign(lanes_ - 1, 0.0f);
   noise_state1_ = 0.0;
   noise_state2_ = 0.0;
   positions_scored_ = 0;
@@ -170,10 +204,11 @@ void AcquisitionScorer::ScoreFrame(const std::vector<float>& baseband_frame_real
   ScorePointers(baseband_frame_real.data(), baseband_frame_imaginary.data(), shift_scores->data());
 }
 
-void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int count) {
-  using audio_dsp::Float4;
-  using audio_dsp::Load4;
-  using audio_dsp::Store4;
+template <typename Vector>
+inline __attribute__((always_inline)) void AcquisitionScorer::ScoreLanes(const float* real,
+                                                                         const float* imag) {
+  constexpr int kWidth = sizeof(Vector) / sizeof(float);
+  constexpr int kLanes = 3 * kWidth;
   // Chunk correlations of the kLanes positions: lane p of every vector
   // belongs to the frame starting p samples on, so one pass over the
   // reference serves all of them and no sum crosses lanes.
@@ -181,104 +216,171 @@ void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int cou
   for (int k = 0; k < num_chunks_; ++k) {
     const int begin = std::min(k * chunk_length_, frame_size_);
     const int end = std::min(begin + chunk_length_, frame_size_);
-    Float4 real0 = {}, real1 = {}, real2 = {}, imag0 = {}, imag1 = {}, imag2 = {};
+    Vector real0 = {}, real1 = {}, real2 = {}, imag0 = {}, imag1 = {}, imag2 = {};
     for (int n = begin; n < end; ++n) {
       const float r = reference[n];
-      real0 += Load4(real + n) * r;
-      real1 += Load4(real + n + 4) * r;
-      real2 += Load4(real + n + 8) * r;
-      imag0 += Load4(imag + n) * r;
-      imag1 += Load4(imag + n + 4) * r;
-      imag2 += Load4(imag + n + 8) * r;
+      Vector v[6];
+      LoadVector(real + n, &v[0]);
+      LoadVector(real + n + kWidth, &v[1]);
+      LoadVector(real + n + 2 * kWidth, &v[2]);
+      LoadVector(imag + n, &v[3]);
+      LoadVector(imag + n + kWidth, &v[4]);
+      LoadVector(imag + n + 2 * kWidth, &v[5]);
+      real0 += v[0] * r;
+      real1 += v[1] * r;
+      real2 += v[2] * r;
+      imag0 += v[3] * r;
+      imag1 += v[4] * r;
+      imag2 += v[5] * r;
     }
     float* chunk_real = chunk_real_.data() + k * kLanes;
     float* chunk_imag = chunk_imag_.data() + k * kLanes;
-    Store4(chunk_real, real0);
-    Store4(chunk_real + 4, real1);
-    Store4(chunk_real + 8, real2);
-    Store4(chunk_imag, imag0);
-    Store4(chunk_imag + 4, imag1);
-    Store4(chunk_imag + 8, imag2);
+    StoreVector(chunk_real, real0);
+    StoreVector(chunk_real + kWidth, real1);
+    StoreVector(chunk_real + 2 * kWidth, real2);
+    StoreVector(chunk_imag, imag0);
+    StoreVector(chunk_imag + kWidth, imag1);
+    StoreVector(chunk_imag + 2 * kWidth, imag2);
   }
 
-  // Shift energies, four lanes at a time. With the phasor (c, d) of shift f
-  // at chunk k and the chunk correlation (x, y):
+  // Shift energies, one vector of lanes at a time. With the phasor (c, d) of
+  // shift f at chunk k and the chunk correlation (x, y):
   //   shift  f: (sum cx - dy)^2 + (sum cy + dx)^2,
   //   shift -f: (sum cx + dy)^2 + (sum cy - dx)^2.
-  for (int half = 0; half < kLanes; half += 4) {
-    const float* cr = chunk_real_.data() + half;
-    const float* ci = chunk_imag_.data() + half;
+  for (int group = 0; group < kLanes; group += kWidth) {
+    const float* cr = chunk_real_.data() + group;
+    const float* ci = chunk_imag_.data() + group;
     const float* phasors = term_phasors_.data();
     for (const ShiftTerm& term : terms_) {
-      Float4 cx = {}, dy = {}, cy = {}, dx = {};
-      for (int k = 0; k < num_chunks_; ++k, phasors += 8) {
-        const Float4 x = Load4(cr + k * kLanes);
-        const Float4 y = Load4(ci + k * kLanes);
-        const Float4 c = Load4(phasors);
-        const Float4 d = Load4(phasors + 4);
+      Vector cx = {}, dy = {}, cy = {}, dx = {};
+      for (int k = 0; k < num_chunks_; ++k, phasors += 2 * kWidth) {
+        Vector x, y, c, d;
+        LoadVector(cr + k * kLanes, &x);
+        LoadVector(ci + k * kLanes, &y);
+        LoadVector(phasors, &c);
+        LoadVector(phasors + kWidth, &d);
         cx += x * c;
         dy += y * d;
         cy += y * c;
         dx += x * d;
       }
-      const Float4 re = cx - dy, im = cy + dx;
-      Store4(block_energies_.data() + term.shift * kLanes + half, re * re + im * im);
+      const Vector re = cx - dy, im = cy + dx;
+      const Vector energy = re * re + im * im;
+      StoreVector(block_energies_.data() + term.shift * kLanes + group, energy);
       if (term.mirror >= 0) {
-        const Float4 mirror_re = cx + dy, mirror_im = cy - dx;
-        Store4(block_energies_.data() + term.mirror * kLanes + half,
-               mirror_re * mirror_re + mirror_im * mirror_im);
+        const Vector mirror_re = cx + dy, mirror_im = cy - dx;
+        const Vector mirror_energy = mirror_re * mirror_re + mirror_im * mirror_im;
+        StoreVector(block_energies_.data() + term.mirror * kLanes + group, mirror_energy);
       }
     }
   }
-  // Each lane's largest energy and energy sum (in double, shift by shift,
-  // as the background's mean is defined).
-  for (int lane = 0; lane < kLanes; ++lane) block_sum_[lane] = 0.0;
-  for (int group = 0; group < kLanes; group += 4) {
-    Float4 best = Load4(block_energies_.data() + group);
+  // Each lane's largest energy, and its energy sum (in double, shift by
+  // shift, as the background's mean is defined).
+  typedef double DoubleVector __attribute__((vector_size(2 * sizeof(Vector))));
+  for (int group = 0; group < kLanes; group += kWidth) {
+    Vector best;
+    LoadVector(block_energies_.data() + group, &best);
+    DoubleVector sum = __builtin_convertvector(best, DoubleVector);
     for (int s = 1; s < num_shifts_; ++s) {
-      const Float4 energies = Load4(block_energies_.data() + s * kLanes + group);
+      Vector energies;
+      LoadVector(block_energies_.data() + s * kLanes + group, &energies);
       best = energies > best ? energies : best;
+      sum += __builtin_convertvector(energies, DoubleVector);
     }
-    Store4(block_best_ + group, best);
+    StoreVector(block_best_ + group, best);
+    std::memcpy(block_sum_ + group, &sum, sizeof(sum));
   }
-  for (int s = 0; s < num_shifts_; ++s) {
-    const float* energies = block_energies_.data() + s * kLanes;
-    for (int lane = 0; lane < kLanes; ++lane) block_sum_[lane] += energies[lane];
+}
+
+void AcquisitionScorer::ScoreLanesFour(const float* real, const float* imag) {
+  ScoreLanes<audio_dsp::Float4>(real, imag);
+}
+
+#ifdef VESK_WIDE_KERNELS
+// Compiled for AVX or AVX-512 alone (no FMA, which would round differently),
+// called only where the processor has it.
+__attribute__((target("avx"))) void AcquisitionScorer::ScoreLanesEight(const float* real,
+                                                                       const float* imag) {
+  ScoreLanes<Float8>(real, imag);
+}
+
+__attribute__((target("avx512f"))) void AcquisitionScorer::ScoreLanesSixteen(const float* real,
+                                                                             const float* imag) {
+  ScoreLanes<Float16>(real, imag);
+}
+
+bool AcquisitionScorer::KernelAvailable(Kernel kernel) {
+  switch (kernel) {
+    case Kernel::kEightLane:
+      return __builtin_cpu_supports("avx");
+    case Kernel::kSixteenLane:
+      return __builtin_cpu_supports("avx512f");
+    default:
+      return true;
+  }
+}
+#else
+void AcquisitionScorer::ScoreLanesEight(const float* real, const float* imag) {
+  ScoreLanesFour(real, imag);
+}
+
+void AcquisitionScorer::ScoreLanesSixteen(const float* real, const float* imag) {
+  ScoreLanesFour(real, imag);
+}
+
+bool AcquisitionScorer::KernelAvailable(Kernel kernel) {
+  return kernel == Kernel::kWidest || kernel == Kernel::kFourLane;
+}
+#endif
+
+void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int count) {
+  if (lanes_ == 48) {
+    ScoreLanesSixteen(real, imag);
+  } else if (lanes_ == 24) {
+    ScoreLanesEight(real, imag);
+  } else {
+    ScoreLanesFour(real, imag);
   }
   // Only the positions asked for: the others' slots may still hold history.
   for (int lane = 0; lane < count; ++lane) {
     float* energies = Energies(positions_scored_ + lane);
-    for (int s = 0; s < num_shifts_; ++s) energies[s] = block_energies_[s * kLanes + lane];
+    for (int s = 0; s < num_shifts_; ++s) energies[s] = block_energies_[s * lanes_ + lane];
   }
 }
 
-void AcquisitionScorer::FinishPosition(float best, double sum,
-                                       std::vector<float>* acquisition_scores) {
-  const int64_t n = positions_scored_;
-  best_energy_[n] = best;
-  if (n == warm_up_ - 1) {
-    // Start the background at the mean of the first positions rather than
-    // at zero, so that early scores are not inflated.
-    double warm_sum = 0.0;
-    for (int64_t p = 0; p < warm_up_; ++p) {
-      const float* energies = Energies(p);
-      for (int s = 0; s < num_shifts_; ++s) warm_sum += energies[s];
+void AcquisitionScorer::FinishBlock(int count, std::vector<float>* acquisition_scores) {
+  // The smoother's state and the position count live in locals across the
+  // block, so that the chain of dependent operations stays in registers.
+  double state1 = noise_state1_, state2 = noise_state2_;
+  int64_t n = positions_scored_;
+  for (int lane = 0; lane < count; ++lane, ++n) {
+    best_energy_[n] = block_best_[lane];
+    if (n == warm_up_ - 1) {
+      // Start the background at the mean of the first positions rather than
+      // at zero, so that early scores are not inflated.
+      double warm_sum = 0.0;
+      for (int64_t p = 0; p < warm_up_; ++p) {
+        const float* energies = Energies(p);
+        for (int s = 0; s < num_shifts_; ++s) warm_sum += energies[s];
+      }
+      state1 = state2 = warm_sum / (static_cast<double>(warm_up_) * num_shifts_);
+    } else if (n > warm_up_ - 1) {
+      const double mean = block_sum_[lane] / num_shifts_;
+      state1 += noise_weight_ * (mean - state1);
+      state2 += noise_weight_ * (state1 - state2);
     }
-    noise_state1_ = noise_state2_ = warm_sum / (static_cast<double>(warm_up_) * num_shifts_);
-  } else if (n > warm_up_ - 1) {
-    const double mean = sum / num_shifts_;
-    noise_state1_ += noise_weight_ * (mean - noise_state1_);
-    noise_state2_ += noise_weight_ * (noise_state1_ - noise_state2_);
-  }
-  ++positions_scored_;
-  // Position n - D is the one whose background the smoother now stands for.
-  if (positions_scored_ > noise_delay_) {
-    float output = 0.0f;
-    if (n >= warm_up_ - 1) {
-      output = static_cast<float>(best_energy_[n - noise_delay_] / (noise_state2_ + 1e-12));
+    // Position n - D is the one whose background the smoother now stands for.
+    if (n + 1 > noise_delay_) {
+      float output = 0.0f;
+      if (n >= warm_up_ - 1) {
+        output = static_cast<float>(best_energy_[n - noise_delay_] / (state2 + 1e-12));
+      }
+      acquisition_scores->push_back(output);
     }
-    acquisition_scores->push_back(output);
   }
+  noise_state1_ = state1;
+  noise_state2_ = state2;
+  positions_scored_ = n;
 }
 
 void AcquisitionScorer::ComputeScores(const std::vector<float>& baseband_real_signal,
@@ -304,8 +406,8 @@ void AcquisitionScorer::ComputeScores(const float* baseband_real_signal,
   // whole frame beyond it has arrived. The zeros behind the samples are read
   // only by lanes of a last block that stand for no position.
   const int total = buffered_ + count;
-  reader_real_.resize(total + kLanes - 1);
-  reader_imag_.resize(total + kLanes - 1);
+  reader_real_.resize(total + lanes_ - 1);
+  reader_imag_.resize(total + lanes_ - 1);
   std::copy(baseband_real_signal, baseband_real_signal + count, reader_real_.begin() + buffered_);
   std::copy(baseband_imaginary_signal, baseband_imaginary_signal + count,
             reader_imag_.begin() + buffered_);
@@ -313,12 +415,10 @@ void AcquisitionScorer::ComputeScores(const float* baseband_real_signal,
   std::fill(reader_imag_.begin() + total, reader_imag_.end(), 0.0f);
 
   const int positions = std::max(0, total - frame_size_ + 1);
-  for (int start = 0; start < positions; start += kLanes) {
-    const int lanes = std::min(kLanes, positions - start);
+  for (int start = 0; start < positions; start += lanes_) {
+    const int lanes = std::min(lanes_, positions - start);
     ScoreBlock(reader_real_.data() + start, reader_imag_.data() + start, lanes);
-    for (int lane = 0; lane < lanes; ++lane) {
-      FinishPosition(block_best_[lane], block_sum_[lane], acquisition_scores);
-    }
+    FinishBlock(lanes, acquisition_scores);
   }
   // Consumed samples go in bulk, so each sample is moved about once.
   if (positions > 0) {
@@ -326,8 +426,8 @@ void AcquisitionScorer::ComputeScores(const float* baseband_real_signal,
     std::copy(reader_imag_.begin() + positions, reader_imag_.begin() + total, reader_imag_.begin());
   }
   buffered_ = total - positions;
-  std::fill(reader_real_.begin() + buffered_, reader_real_.begin() + buffered_ + kLanes - 1, 0.0f);
-  std::fill(reader_imag_.begin() + buffered_, reader_imag_.begin() + buffered_ + kLanes - 1, 0.0f);
+  std::fill(reader_real_.begin() + buffered_, reader_real_.begin() + buffered_ + lanes_ - 1, 0.0f);
+  std::fill(reader_imag_.begin() + buffered_, reader_imag_.begin() + buffered_ + lanes_ - 1, 0.0f);
 }
 
 float AcquisitionScorer::GetBroadcasterScore(bool normalize) const {

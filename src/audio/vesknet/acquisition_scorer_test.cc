@@ -132,6 +132,21 @@ Signal MakeSignal(const std::vector<float>& code, int length, const std::vector<
   return s;
 }
 
+TEST(AcquisitionScorerTest, KernelWidthFollowsTheProcessor) {
+  using Kernel = AcquisitionScorer::Kernel;
+  const std::vector<float> code = Code(5);
+  const auto lanes = [&](Kernel kernel) {
+    return AcquisitionScorer(code, kShifts, 4, 20.0f, 100, kernel).lanes();
+  };
+  EXPECT_EQ(lanes(Kernel::kFourLane), 12);
+  EXPECT_EQ(lanes(Kernel::kEightLane),
+            AcquisitionScorer::KernelAvailable(Kernel::kEightLane) ? 24 : 12);
+  EXPECT_EQ(lanes(Kernel::kSixteenLane),
+            AcquisitionScorer::KernelAvailable(Kernel::kSixteenLane) ? 48 : 12);
+  EXPECT_EQ(lanes(Kernel::kWidest),
+            std::max(lanes(Kernel::kEightLane), lanes(Kernel::kSixteenLane)));
+}
+
 TEST(AcquisitionScorerTest, GeometryFollowsTheConfiguration) {
   const std::vector<float> reference(100, 1.0f);
   const AcquisitionScorer wide(reference, kShifts, 16, 20.0f, 450);
@@ -238,9 +253,16 @@ TEST(AcquisitionScorerTest, EqualsTheDirectComputation) {
     std::vector<int> starts;
     for (int start = 3 * f + 5; start < 20 * f; start += f) starts.push_back(start);
     const Signal signal = MakeSignal(code, 25 * f, starts, c.cycles_per_frame, 0.5f, 11);
+    // The widest kernel against the direct form, the others against it.
     AcquisitionScorer scorer(code, c.shifts, c.num_chunks, 20.0f, 4 * f);
+    using Kernel = AcquisitionScorer::Kernel;
+    std::vector<AcquisitionScorer> narrower;
+    for (const Kernel kernel : {Kernel::kFourLane, Kernel::kEightLane}) {
+      narrower.emplace_back(code, c.shifts, c.num_chunks, 20.0f, 4 * f, kernel);
+    }
     DirectScorer direct(code, c.shifts, c.num_chunks, 20.0f, 4 * f);
     std::vector<float> got, want, scores;
+    std::vector<std::vector<float>> got_narrower(narrower.size());
     std::uniform_int_distribution<int> block(1, 3 * f);
     for (size_t start = 0; start < signal.real.size();) {
       const size_t end = std::min(signal.real.size(), start + block(rng));
@@ -248,11 +270,18 @@ TEST(AcquisitionScorerTest, EqualsTheDirectComputation) {
       const std::vector<float> imag(signal.imag.begin() + start, signal.imag.begin() + end);
       scorer.ComputeScores(real, imag, &scores);
       got.insert(got.end(), scores.begin(), scores.end());
+      for (size_t i = 0; i < narrower.size(); ++i) {
+        narrower[i].ComputeScores(real, imag, &scores);
+        got_narrower[i].insert(got_narrower[i].end(), scores.begin(), scores.end());
+        EXPECT_EQ(narrower[i].GetBroadcasterScore(true), scorer.GetBroadcasterScore(true));
+      }
       direct.Add(real, imag, &want);
       const float broadcaster = direct.BroadcasterScore();
       EXPECT_NEAR(scorer.GetBroadcasterScore(true), broadcaster, 1e-5f * broadcaster) << c.taps;
       start = end;
     }
+    // The vector width changes nothing, to the bit.
+    for (const std::vector<float>& other : got_narrower) EXPECT_EQ(other, got) << c.taps;
     ASSERT_EQ(got.size(), want.size());
     EXPECT_GT(*std::max_element(want.begin(), want.end()), 5.0f);  // The frames stand out.
     // Scores are ratios to a background near 1: below 0.01 only the absolute

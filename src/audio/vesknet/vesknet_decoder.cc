@@ -213,16 +213,42 @@ void VesknetDecoder::AppendBaseband(const float* mono, int count) {
     phasor_real[k] = phasor_real[k - 1] * step_real - phasor_imag[k - 1] * step_imag;
     phasor_imag[k] = phasor_real[k - 1] * step_imag + phasor_imag[k - 1] * step_real;
   }
+  // Chains 0, 1 and 2, 3 in two-lane vectors: each lane computes what the
+  // scalar chain would (and the 32-bit build keeps them in registers).
+  using audio_dsp::Double2;
+  Double2 real01 = {phasor_real[0], phasor_real[1]}, real23 = {phasor_real[2], phasor_real[3]};
+  Double2 imag01 = {phasor_imag[0], phasor_imag[1]}, imag23 = {phasor_imag[2], phasor_imag[3]};
+  const Double2 step4_re = {step4_real, step4_real}, step4_im = {step4_imag, step4_imag};
+  float* mixed = reinterpret_cast<float*>(mixed_.data());
   int i = 0;
   for (; i + 4 <= count; i += 4) {
-    for (int k = 0; k < 4; ++k) {
-      mixed_[i + k] = std::complex<float>(static_cast<float>(mono[i + k] * phasor_real[k]),
-                                          static_cast<float>(mono[i + k] * phasor_imag[k]));
-      const double next_real = phasor_real[k] * step4_real - phasor_imag[k] * step4_imag;
-      phasor_imag[k] = phasor_real[k] * step4_imag + phasor_imag[k] * step4_real;
-      phasor_real[k] = next_real;
-    }
+    const Double2 x01 = {mono[i], mono[i + 1]}, x23 = {mono[i + 2], mono[i + 3]};
+    const Double2 mixed_real01 = x01 * real01, mixed_imag01 = x01 * imag01;
+    const Double2 mixed_real23 = x23 * real23, mixed_imag23 = x23 * imag23;
+    // Interleaved (real, imaginary) pairs, rounded to float.
+    audio_dsp::Store4(
+        mixed + 2 * i,
+        audio_dsp::ToFloat4(__builtin_shufflevector(mixed_real01, mixed_imag01, 0, 2),
+                            __builtin_shufflevector(mixed_real01, mixed_imag01, 1, 3)));
+    audio_dsp::Store4(
+        mixed + 2 * i + 4,
+        audio_dsp::ToFloat4(__builtin_shufflevector(mixed_real23, mixed_imag23, 0, 2),
+                            __builtin_shufflevector(mixed_real23, mixed_imag23, 1, 3)));
+    const Double2 next_real01 = real01 * step4_re - imag01 * step4_im;
+    imag01 = real01 * step4_im + imag01 * step4_re;
+    real01 = next_real01;
+    const Double2 next_real23 = real23 * step4_re - imag23 * step4_im;
+    imag23 = real23 * step4_im + imag23 * step4_re;
+    real23 = next_real23;
   }
+  phasor_real[0] = real01[0];
+  phasor_real[1] = real01[1];
+  phasor_real[2] = real23[0];
+  phasor_real[3] = real23[1];
+  phasor_imag[0] = imag01[0];
+  phasor_imag[1] = imag01[1];
+  phasor_imag[2] = imag23[0];
+  phasor_imag[3] = imag23[1];
   const int rest = count - i;
   for (int k = 0; k < rest; ++k) {
     mixed_[i + k] = std::complex<float>(static_cast<float>(mono[i + k] * phasor_real[k]),
@@ -482,12 +508,17 @@ void VesknetDecoder::GroupCandidateStarts() {
   const int n = smoothed_.size();
   for (int i = 0; i < n;) {
     // Smoothed scores are 0 or above the threshold, so a zero bit pattern is
-    // a zero score: skip them eight at a time.
-    uint64_t bits[4];
-    if (i + 8 <= n && (std::memcpy(bits, smoothed + i, sizeof(bits)),
-                       (bits[0] | bits[1] | bits[2] | bits[3]) == 0)) {
-      i += 8;
-      continue;
+    // a zero score: skip them eight at a time (in 32-bit words, which the
+    // 32-bit build keeps in its registers).
+    if (i + 8 <= n) {
+      uint32_t bits[8];
+      std::memcpy(bits, smoothed + i, sizeof(bits));
+      uint32_t any = 0;
+      for (const uint32_t word : bits) any |= word;
+      if (any == 0) {
+        i += 8;
+        continue;
+      }
     }
     if (!(smoothed[i] > 0.0f)) {
       ++i;
