@@ -115,7 +115,9 @@ struct Options {
   double record_from_s = 0.0;
   double record_seconds = 60.0;
   std::string decoders = "dsss48,dsss44,dtmf,listening";
-  DtmfTrial dtmf;  // The DTMF receiver: product defaults unless --dtmf-set.
+  // The DTMF receiver (its config, tuning and excision; the channel and
+  // window are not used): product defaults unless --dtmf-set.
+  DtmfTrial dtmf;
 };
 
 enum class Sound { kNoise, kBabble, kMusic, kZero, kQuietNoise };
