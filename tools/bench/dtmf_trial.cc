@@ -31,8 +31,14 @@ std::unique_ptr<audio_modem::AudioModemEncoder> MakeEncoder(const DtmfTrial& tri
       std::make_unique<audio_vesknet::DtmfEncoder>(params));
 }
 
-std::unique_ptr<audio_modem::AudioModemDecoder> MakeDecoder(const DtmfTrial& trial, int rate,
-                                                            int channels) {
+int MessageBytes(const DtmfTrial& trial) {
+  return trial.config.bytes_in_token - (trial.crc ? 2 : 0);
+}
+
+}  // namespace
+
+std::unique_ptr<audio_modem::AudioModemDecoder> MakeDtmfTrialDecoder(const DtmfTrial& trial,
+                                                                     int rate, int channels) {
   audio_modem::DtmfDecoderConfig config = trial.config;
   config.input_sample_rate = static_cast<float>(rate);
   config.num_channels = channels;
@@ -46,12 +52,6 @@ std::unique_ptr<audio_modem::AudioModemDecoder> MakeDecoder(const DtmfTrial& tri
   return decoder;
 }
 
-int MessageBytes(const DtmfTrial& trial) {
-  return trial.config.bytes_in_token - (trial.crc ? 2 : 0);
-}
-
-}  // namespace
-
 TrialResult RunDtmfTrial(const DtmfTrial& trial, uint64_t seed) {
   const std::vector<uint8_t> message = RandomMessage(MessageBytes(trial), seed);
   const auto encoder = MakeEncoder(trial);
@@ -62,14 +62,14 @@ TrialResult RunDtmfTrial(const DtmfTrial& trial, uint64_t seed) {
   return vesk_tool::Judge(
       vesk_tool::SendOverTheAir(
           *encoder, message, trial.crc ? 2 : 0, air,
-          [&](int rate, int channels) { return MakeDecoder(trial, rate, channels); },
+          [&](int rate, int channels) { return MakeDtmfTrialDecoder(trial, rate, channels); },
           vesk_tool::StreamDecodingOptions()),
       message);
 }
 
 int CountDtmfFalseTokens(const DtmfTrial& trial, double seconds, bool babble, uint64_t seed) {
   const int rate = trial.channel.mic_rate;
-  const auto decoder = MakeDecoder(trial, rate, 1);
+  const auto decoder = MakeDtmfTrialDecoder(trial, rate, 1);
   return CountFalseTokens(decoder.get(), rate, MessageBytes(trial), trial.crc ? 2 : 0, seconds,
                           babble, seed, vesk_tool::StreamDecodingOptions());
 }

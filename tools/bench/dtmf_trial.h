@@ -4,6 +4,7 @@
 #define TOOLS_BENCH_DTMF_TRIAL_H_
 
 #include <cstdint>
+#include <memory>
 #include <string>
 
 #include "audio/vesknet/dtmf/dtmf_decoder.h"
@@ -32,6 +33,12 @@ struct DtmfTrial {
 };
 
 TrialResult RunDtmfTrial(const DtmfTrial& trial, uint64_t seed);
+
+// The trial's receiver (configuration, tuning and excision stage) for a
+// microphone at `rate` Hz with `channels` channels; null when the envelope
+// is refused.
+std::unique_ptr<audio_modem::AudioModemDecoder> MakeDtmfTrialDecoder(const DtmfTrial& trial,
+                                                                     int rate, int channels);
 
 // Tokens reported from `seconds` of white noise (1000 rms) or speech babble
 // (3000 rms) alone, with the same decoding loop: every one is a false token.

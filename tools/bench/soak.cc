@@ -8,10 +8,18 @@
 // was sent to that decoder; the heap and the resident set are watched.
 //
 //   soak [--hours H] [--seed N] [--min-snr DB] [--max-snr DB] [--hostile]
+//        [--decoders dsss48,dsss44,dtmf,listening] [--dtmf-set name=value,...]
 //        [--record FILE [--record-from S] [--record-seconds N]]
 //
 // --hostile sends no token and adds music (chords of harmonic tones) to the
 // background sounds: every reported token is false.
+//
+// --decoders runs only the decoders listed (all four by default). The
+// stream is the same whichever run: every transmitter still plays into it,
+// so a decoder's counts do not depend on which others run, and a day of one
+// decoder costs a fraction of the four. --dtmf-set changes the DTMF
+// receiver's tuning or configuration as dtmf_robustness --set does (see
+// dtmf_trial.h), to measure false tokens against a tuning.
 //
 // --record writes the microphone stream from stream time --record-from on,
 // for --record-seconds, as headerless 16-bit little-endian PCM (48 kHz
@@ -19,17 +27,17 @@
 // `vesk decode --raw --rate 48000 --channels 1`.
 //
 // The output ends with one line:
-//   RESULT hours=H decoders=4 tokens_sent=N tokens_decoded=D false_tokens=F
+//   RESULT hours=H decoders=R tokens_sent=N tokens_decoded=D false_tokens=F
 //          heap_start_kib=S heap_end_kib=E rss_peak_kib=P
-// (on one line). A token meant for the 48 kHz coder is sent to two decoders,
-// the plain one and the listening mode, and counts twice in N; D counts the
-// (token, decoder) pairs in which the decoder reported the token. A false
-// token is a report of a message that was not sent to that decoder in the
-// last kMatchSeconds; each is printed with the last tokens sent to that
-// decoder and the number of bytes in which it differs from each. The heap
-// is glibc's in use (mallinfo2: arena and mmapped blocks), taken between
-// segments, when no temporary buffer is alive: at the start after warming
-// up (the first simulated minute), and at the end.
+// (on one line; R decoders ran). A token meant for the 48 kHz coder is sent
+// to two decoders, the plain one and the listening mode, and counts twice in
+// N; D counts the (token, decoder) pairs in which the decoder reported the
+// token. A false token is a report of a message that was not sent to that
+// decoder in the last kMatchSeconds; each is printed with the last tokens
+// sent to that decoder and the number of bytes in which it differs from
+// each. The heap is glibc's in use (mallinfo2: arena and mmapped blocks),
+// taken between segments, when no temporary buffer is alive: at the start
+// after warming up (the first simulated minute), and at the end.
 
 #include <malloc.h>
 #include <sys/resource.h>
@@ -46,6 +54,8 @@
 
 #include "social/tandry/audio/audio_modem_decoder.h"
 #include "social/tandry/audio/audio_modem_encoder.h"
+#include "tools/bench/bench_util.h"
+#include "tools/bench/dtmf_trial.h"
 #include "tools/bench/trial.h"
 #include "tools/channel/babble.h"
 #include "tools/channel/channel_simulator.h"
@@ -104,6 +114,10 @@ struct Options {
   std::string record_path;  // Empty: no recording.
   double record_from_s = 0.0;
   double record_seconds = 60.0;
+  std::string decoders = "dsss48,dsss44,dtmf,listening";
+  // The DTMF receiver (its config, tuning and excision; the channel and
+  // window are not used): product defaults unless --dtmf-set.
+  DtmfTrial dtmf;
 };
 
 enum class Sound { kNoise, kBabble, kMusic, kZero, kQuietNoise };
@@ -204,6 +218,7 @@ struct Receiver {
   };
 
   const char* name;
+  // Null when the decoder does not run (see --decoders).
   std::unique_ptr<audio_modem::AudioModemDecoder> decoder;
   std::unique_ptr<vesk_tool::StreamDecoder> stream;
   std::vector<Sent> pending;  // Sent in the last kMatchSeconds.
@@ -303,24 +318,32 @@ void Soak::AddReceivers() {
   dsss44.waveform = audio_modem::Waveform44100();
   audio_modem::DsssDecoderConfig listening = dsss;
   listening.use_zintar = true;
-  audio_modem::DtmfDecoderConfig dtmf;
-  dtmf.input_sample_rate = kMicRate;
   // The listening mode's fall-back timer runs on stream time, as it would
   // on a phone that hears the stream in real time.
   const audio_modem::ZintarDecoder::Clock stream_clock = [this] {
     return frames_ * 1000 / kMicRate;
   };
   receivers_[0].name = "DSSS 48k";
-  receivers_[0].decoder = audio_modem::MakeDsssAudioModemDecoder(dsss);
   receivers_[1].name = "DSSS 44.1k";
-  receivers_[1].decoder = audio_modem::MakeDsssAudioModemDecoder(dsss44);
   receivers_[2].name = "DTMF";
-  receivers_[2].decoder = audio_modem::MakeDtmfAudioModemDecoder(dtmf);
   receivers_[3].name = "listening";
-  receivers_[3].decoder = audio_modem::MakeDsssAudioModemDecoder(
-      listening, audio_vesknet::VesknetDecoderParams(), stream_clock);
-  const int dtmf_bytes = dtmf.bytes_in_token;
+  const std::string& run = options_.decoders;
+  if (HasItem(run, "dsss48")) {
+    receivers_[0].decoder = audio_modem::MakeDsssAudioModemDecoder(dsss);
+  }
+  if (HasItem(run, "dsss44")) {
+    receivers_[1].decoder = audio_modem::MakeDsssAudioModemDecoder(dsss44);
+  }
+  if (HasItem(run, "dtmf")) {
+    receivers_[2].decoder = MakeDtmfTrialDecoder(options_.dtmf, kMicRate, 1);
+  }
+  if (HasItem(run, "listening")) {
+    receivers_[3].decoder = audio_modem::MakeDsssAudioModemDecoder(
+        listening, audio_vesknet::VesknetDecoderParams(), stream_clock);
+  }
+  const int dtmf_bytes = options_.dtmf.config.bytes_in_token;
   for (Receiver& r : receivers_) {
+    if (r.decoder == nullptr) continue;
     vesk_tool::StreamDecodingOptions stream;
     stream.zintar = r.decoder->kind() == audio_modem::AudioModemDecoder::kZintar;
     const bool is_dtmf = r.decoder->kind() == audio_modem::AudioModemDecoder::kDtmf;
@@ -399,6 +422,7 @@ void Soak::Transmit() {
                             now_s() + static_cast<double>(heard.samples.size()) / kMicRate, snr_db,
                             false};
   for (Receiver* receiver : transmitter.receivers) {
+    if (receiver->decoder == nullptr) continue;
     receiver->pending.push_back(sent);
     if (receiver->last.size() == kLastSent) receiver->last.erase(receiver->last.begin());
     receiver->last.push_back(sent);
@@ -416,6 +440,7 @@ void Soak::Feed(const std::vector<int16_t>& pcm) {
   for (int64_t start = 0; start < size; start += kChunkSamples) {
     const int64_t count = std::min<int64_t>(kChunkSamples, size - start);
     for (Receiver& r : receivers_) {
+      if (r.decoder == nullptr) continue;
       for (const vesk_tool::FoundToken& token : r.stream->Feed(pcm.data() + start, count)) {
         Judge(&r, token);
       }
@@ -488,27 +513,31 @@ void Soak::Checkpoint() {
 void Soak::Report() const {
   const double wall_s =
       std::chrono::duration<double>(std::chrono::steady_clock::now() - started_).count();
-  int sent = 0, decoded = 0, false_tokens = 0;
+  std::vector<const Receiver*> running;
   for (const Receiver& r : receivers_) {
-    sent += r.sent;
-    decoded += r.decoded;
-    false_tokens += r.false_tokens;
+    if (r.decoder != nullptr) running.push_back(&r);
+  }
+  int sent = 0, decoded = 0, false_tokens = 0;
+  for (const Receiver* r : running) {
+    sent += r->sent;
+    decoded += r->decoded;
+    false_tokens += r->false_tokens;
   }
   std::printf("\n### %g simulated hours%s, seed %d\n\n", options_.hours,
               options_.hostile ? " of hostile sound" : "", options_.seed);
   if (sent > 0) {
     std::printf("Tokens decoded / sent per full-band SNR band:\n\n| SNR dB |");
-    for (const Receiver& r : receivers_) std::printf(" %s |", r.name);
-    std::printf("\n|---|---|---|---|---|\n");
+    for (const Receiver* r : running) std::printf(" %s |", r->name);
+    std::printf("\n|---|");
+    for (size_t i = 0; i < running.size(); ++i) std::printf("---|");
+    std::printf("\n");
     for (int band = 0; band < kNumBands; ++band) {
-      if (receivers_[0].bands[band].sent + receivers_[1].bands[band].sent +
-              receivers_[2].bands[band].sent ==
-          0) {
-        continue;
-      }
+      int band_sent = 0;
+      for (const Receiver* r : running) band_sent += r->bands[band].sent;
+      if (band_sent == 0) continue;
       std::printf("| %g to %g |", kBandEdges[band], kBandEdges[band + 1]);
-      for (const Receiver& r : receivers_) {
-        const Tally& t = r.bands[band];
+      for (const Receiver* r : running) {
+        const Tally& t = r->bands[band];
         if (t.sent == 0) {
           std::printf(" - |");
         } else {
@@ -521,11 +550,11 @@ void Soak::Report() const {
   }
   std::printf("| decoder | sent | decoded | reported again | false | wake-ups |\n");
   std::printf("|---|---|---|---|---|---|\n");
-  for (const Receiver& r : receivers_) {
-    std::printf("| %s | %d | %d | %d | %d | %s |\n", r.name, r.sent, r.decoded, r.repeats,
-                r.false_tokens,
-                r.decoder->kind() == audio_modem::AudioModemDecoder::kZintar
-                    ? std::to_string(r.wake_ups).c_str()
+  for (const Receiver* r : running) {
+    std::printf("| %s | %d | %d | %d | %d | %s |\n", r->name, r->sent, r->decoded, r->repeats,
+                r->false_tokens,
+                r->decoder->kind() == audio_modem::AudioModemDecoder::kZintar
+                    ? std::to_string(r->wake_ups).c_str()
                     : "-");
   }
   std::printf("\nheap in use between segments after warming up: %ld to %ld KiB\n", heap_low_kib_,
@@ -533,10 +562,25 @@ void Soak::Report() const {
   std::printf("%s simulated in %.0f s of wall time (%.1fx real time)\n", Clock(now_s()).c_str(),
               wall_s, now_s() / wall_s);
   std::printf(
-      "RESULT hours=%g decoders=4 tokens_sent=%d tokens_decoded=%d false_tokens=%d "
+      "RESULT hours=%g decoders=%zu tokens_sent=%d tokens_decoded=%d false_tokens=%d "
       "heap_start_kib=%ld heap_end_kib=%ld rss_peak_kib=%ld\n",
-      options_.hours, sent, decoded, false_tokens, heap_start_kib_, heap_end_kib_,
+      options_.hours, running.size(), sent, decoded, false_tokens, heap_start_kib_, heap_end_kib_,
       PeakResidentKib());
+}
+
+// Empty when `list` names at least one decoder and only known ones.
+std::string DecodersError(const std::string& list) {
+  static const char* const kKnown[] = {"dsss48", "dsss44", "dtmf", "listening"};
+  std::string rest = "," + list + ",";
+  for (const char* name : kKnown) {
+    const std::string item = std::string(",") + name + ",";
+    for (size_t at; (at = rest.find(item)) != std::string::npos;) rest.erase(at, item.size() - 1);
+  }
+  if (rest.find_first_not_of(',') != std::string::npos) {
+    return "unknown decoder in --decoders '" + list + "' (dsss48,dsss44,dtmf,listening)";
+  }
+  if (rest.size() == list.size() + 2) return "--decoders names no decoder";
+  return "";
 }
 
 // Returns -1 to go on, or the exit status.
@@ -557,6 +601,13 @@ int ParseOptions(int argc, char** argv, Options* options) {
       .AddString("record", &options->record_path,
                  "write the microphone stream as headerless 16-bit PCM to this file")
       .Placeholder("FILE");
+  parser
+      .AddString("decoders", &options->decoders,
+                 "the decoders that run, of dsss48,dsss44,dtmf,listening")
+      .Placeholder("LIST");
+  std::string dtmf_set;
+  parser.AddString("dtmf-set", &dtmf_set, "DTMF receiver overrides: name=value,name=value")
+      .Placeholder("LIST");
   parser.AddDouble("record-from", &options->record_from_s, "stream time where recording starts, s")
       .Range(0, 3.6e6);
   parser.AddDouble("record-seconds", &options->record_seconds, "seconds to record").Range(0, 3.6e6);
@@ -574,6 +625,12 @@ int ParseOptions(int argc, char** argv, Options* options) {
   }
   if (error.empty() && options->min_snr_db > options->max_snr_db) {
     error = "--min-snr must not exceed --max-snr";
+  }
+  if (error.empty()) error = DecodersError(options->decoders);
+  if (error.empty() && !ApplyAssignments(dtmf_set, [&](const std::string& assignment) {
+        return SetDtmfTuning(assignment, &options->dtmf);
+      })) {
+    return 2;  // ApplyAssignments said which.
   }
   if (!error.empty()) {
     std::fprintf(stderr, "%s: %s\n", argv[0], error.c_str());

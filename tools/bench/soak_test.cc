@@ -1,6 +1,7 @@
 // The soak program over a few simulated minutes: its output ends with a
 // well-formed RESULT line; loud tokens are all decoded, hostile sound
-// reports nothing, no token is false and the heap stays flat.
+// reports nothing, no token is false and the heap stays flat; a decoder
+// run alone hears what it hears among the four.
 
 #include <unistd.h>
 
@@ -19,6 +20,7 @@ struct Result {
   bool ok = false;  // The last line is a RESULT line.
   std::string out;  // The whole output.
   std::string hours;
+  int decoders = -1;
   int sent = -1, decoded = -1, false_tokens = -1;
   long heap_start_kib = -1, heap_end_kib = -1, rss_peak_kib = -1;
 };
@@ -28,7 +30,7 @@ Result RunSoak(std::vector<std::string> args) {
   const vesk_tool::ProcessResult run = vesk_tool::RunProcess(SOAK, args);
   EXPECT_EQ(run.exit_status, 0) << run.err;
   static const std::regex kLine(
-      "RESULT hours=([0-9.]+) decoders=4 tokens_sent=([0-9]+) tokens_decoded=([0-9]+) "
+      "RESULT hours=([0-9.]+) decoders=([0-9]+) tokens_sent=([0-9]+) tokens_decoded=([0-9]+) "
       "false_tokens=([0-9]+) heap_start_kib=([0-9]+) heap_end_kib=([0-9]+) "
       "rss_peak_kib=([0-9]+)\n$");
   Result result;
@@ -42,12 +44,13 @@ Result RunSoak(std::vector<std::string> args) {
   result.ok = true;
   result.out = run.out;
   result.hours = m[1];
-  result.sent = std::stoi(m[2]);
-  result.decoded = std::stoi(m[3]);
-  result.false_tokens = std::stoi(m[4]);
-  result.heap_start_kib = std::stol(m[5]);
-  result.heap_end_kib = std::stol(m[6]);
-  result.rss_peak_kib = std::stol(m[7]);
+  result.decoders = std::stoi(m[2]);
+  result.sent = std::stoi(m[3]);
+  result.decoded = std::stoi(m[4]);
+  result.false_tokens = std::stoi(m[5]);
+  result.heap_start_kib = std::stol(m[6]);
+  result.heap_end_kib = std::stol(m[7]);
+  result.rss_peak_kib = std::stol(m[8]);
   return result;
 }
 
@@ -66,10 +69,14 @@ std::vector<int> RowOf(const Result& result, const std::string& decoder) {
 int SentTo(const Result& result, const std::string& decoder) { return RowOf(result, decoder)[0]; }
 
 // The totals of the RESULT line are the sums of the per-decoder table, and
-// the SNR band table adds up to each decoder's sent and decoded counts.
-void ExpectTablesAddUp(const Result& result) {
+// the SNR band table adds up to each decoder's sent and decoded counts;
+// `decoders` are the rows and columns, in order.
+void ExpectTablesAddUp(const Result& result, const std::vector<std::string>& decoders = {
+                                                 std::begin(kDecoders), std::end(kDecoders)}) {
+  const int n = static_cast<int>(decoders.size());
+  EXPECT_EQ(result.decoders, n);
   int sent = 0, decoded = 0, false_tokens = 0;
-  for (const char* decoder : kDecoders) {
+  for (const std::string& decoder : decoders) {
     const std::vector<int> row = RowOf(result, decoder);
     ASSERT_GE(row[0], 0) << decoder << " has no row in:\n" << result.out;
     sent += row[0];
@@ -80,7 +87,7 @@ void ExpectTablesAddUp(const Result& result) {
   EXPECT_EQ(decoded, result.decoded);
   EXPECT_EQ(false_tokens, result.false_tokens);
   // Band rows: "| low to high |" then per decoder "- |" or "d/s (p%) |".
-  int band_sent[4] = {}, band_decoded[4] = {};
+  std::vector<int> band_sent(n), band_decoded(n);
   const std::regex band_row("\\| -?[0-9]+ to -?[0-9]+ \\|(.*)\n");
   const std::regex cell(" (?:-|([0-9]+)/([0-9]+) \\([0-9]+%\\)) \\|");
   for (std::sregex_iterator row(result.out.begin(), result.out.end(), band_row), end; row != end;
@@ -88,17 +95,17 @@ void ExpectTablesAddUp(const Result& result) {
     const std::string cells = (*row)[1];
     int column = 0;
     for (std::sregex_iterator c(cells.begin(), cells.end(), cell); c != end; ++c, ++column) {
-      ASSERT_LT(column, 4) << (*row)[0];
+      ASSERT_LT(column, n) << (*row)[0];
       if ((*c)[1].matched) {
         band_decoded[column] += std::stoi((*c)[1]);
         band_sent[column] += std::stoi((*c)[2]);
       }
     }
-    EXPECT_EQ(column, 4) << (*row)[0];
+    EXPECT_EQ(column, n) << (*row)[0];
   }
-  for (int i = 0; i < 4; ++i) {
-    EXPECT_EQ(band_sent[i], RowOf(result, kDecoders[i])[0]) << kDecoders[i];
-    EXPECT_EQ(band_decoded[i], RowOf(result, kDecoders[i])[1]) << kDecoders[i];
+  for (int i = 0; i < n; ++i) {
+    EXPECT_EQ(band_sent[i], RowOf(result, decoders[i])[0]) << decoders[i];
+    EXPECT_EQ(band_decoded[i], RowOf(result, decoders[i])[1]) << decoders[i];
   }
 }
 
@@ -140,6 +147,29 @@ TEST(SoakTest, AnySnrNoFalseTokenAndRepeatable) {
   const Result again = RunSoak({"--seed", "4"});
   EXPECT_EQ(again.sent, result.sent);
   EXPECT_EQ(again.decoded, result.decoded);
+  // Alone, or with one other, a decoder hears the same stream: the other
+  // transmitters still play.
+  const Result dtmf = RunSoak({"--seed", "4", "--decoders", "dtmf"});
+  ASSERT_TRUE(dtmf.ok);
+  ExpectTablesAddUp(dtmf, {"DTMF"});
+  EXPECT_EQ(RowOf(dtmf, "DSSS 48k")[0], -1);
+  EXPECT_EQ(RowOf(dtmf, "DTMF"), RowOf(result, "DTMF"));
+  EXPECT_EQ(dtmf.sent, SentTo(result, "DTMF"));
+  const Result two = RunSoak({"--seed", "4", "--decoders", "listening,dsss44"});
+  ASSERT_TRUE(two.ok);
+  ExpectTablesAddUp(two, {"DSSS 44.1k", "listening"});
+  EXPECT_EQ(RowOf(two, "DSSS 44.1k"), RowOf(result, "DSSS 44.1k"));
+  EXPECT_EQ(RowOf(two, "listening"), RowOf(result, "listening"));
+}
+
+// --dtmf-set reaches the DTMF receiver: a threshold no score reaches
+// decodes nothing of what is sent to it.
+TEST(SoakTest, DtmfTuningReachesTheReceiver) {
+  const Result deaf = RunSoak({"--min-snr", "10", "--max-snr", "20", "--seed", "3", "--decoders",
+                               "dtmf", "--dtmf-set", "acquisition_threshold=1e9"});
+  ASSERT_TRUE(deaf.ok);
+  EXPECT_GT(deaf.sent, 0);
+  EXPECT_EQ(deaf.decoded, 0);
 }
 
 TEST(SoakTest, HostileSoundReportsNothing) {
@@ -188,12 +218,23 @@ TEST(SoakTest, RecordsTheSpanAskedFor) {
   EXPECT_NE(unwritable.err.find("cannot write"), std::string::npos) << unwritable.err;
 }
 
-TEST(SoakTest, RefusesAnEmptySnrRange) {
-  const vesk_tool::ProcessResult run =
-      vesk_tool::RunProcess(SOAK, {"--min-snr", "5", "--max-snr", "4"});
-  EXPECT_EQ(run.exit_status, 2);
-  EXPECT_NE(run.err.find("--min-snr must not exceed --max-snr"), std::string::npos) << run.err;
-  EXPECT_EQ(run.out.find("RESULT"), std::string::npos);
+TEST(SoakTest, RefusesBadOptions) {
+  const struct {
+    std::vector<std::string> args;
+    const char* error;
+  } kCases[] = {
+      {{"--min-snr", "5", "--max-snr", "4"}, "--min-snr must not exceed --max-snr"},
+      {{"--decoders", "dtmf,dsss"}, "unknown decoder in --decoders 'dtmf,dsss'"},
+      {{"--decoders", "dtmfx"}, "unknown decoder"},
+      {{"--decoders", ","}, "--decoders names no decoder"},
+      {{"--dtmf-set", "no_such_field=1"}, "unknown tuning or bad value: no_such_field=1"},
+  };
+  for (const auto& c : kCases) {
+    const vesk_tool::ProcessResult run = vesk_tool::RunProcess(SOAK, c.args);
+    EXPECT_EQ(run.exit_status, 2) << c.error;
+    EXPECT_NE(run.err.find(c.error), std::string::npos) << run.err;
+    EXPECT_EQ(run.out.find("RESULT"), std::string::npos);
+  }
 }
 
 }  // namespace
