@@ -7,7 +7,7 @@
 #
 #   scripts/figures.sh              every table: white noise, speed, reverberation,
 #                                   the listening mode, then every impairment
-#                                   (about an hour on 2 cores)
+#                                   (about 10 minutes on 2 cores)
 #   scripts/figures.sh IMPAIRMENT...  only these impairment tables (names as in
 #                                   tools/bench/impairment_tables.h: phone, clip, tone...)
 #   VALUES=-10,0 scripts/figures.sh tone   one table at chosen points only
