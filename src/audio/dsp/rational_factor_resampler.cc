@@ -37,24 +37,28 @@ inline Float4 PartialSums(const float* a, const float* b, int n) {
   return acc0 + acc1;
 }
 
+// The last n mod 4 products of taps[m] * x[m] (up to three, independent of
+// each other), summed as the one-output code sums them; 0 when n is a
+// multiple of 4. T is float, or Float4 for four outputs side by side.
+template <typename T>
+inline T TailProducts(const T* taps, const T* x, int n) {
+  const int tail = n & ~3;
+  switch (n - tail) {
+    case 3:
+      return taps[tail] * x[tail] + (taps[tail + 1] * x[tail + 1] + taps[tail + 2] * x[tail + 2]);
+    case 2:
+      return taps[tail] * x[tail] + taps[tail + 1] * x[tail + 1];
+    case 1:
+      return taps[tail] * x[tail];
+    default:
+      return T{};
+  }
+}
+
 // Real samples: one float per tap.
 inline float Dot(const float* taps, const float* x, int num_taps) {
   const Float4 acc = PartialSums(taps, x, num_taps);
-  // Up to three remaining products, independent of each other.
-  const int tail = num_taps & ~3;
-  float rest = 0.0f;
-  switch (num_taps - tail) {
-    case 3:
-      rest = taps[tail] * x[tail] + (taps[tail + 1] * x[tail + 1] + taps[tail + 2] * x[tail + 2]);
-      break;
-    case 2:
-      rest = taps[tail] * x[tail] + taps[tail + 1] * x[tail + 1];
-      break;
-    case 1:
-      rest = taps[tail] * x[tail];
-      break;
-  }
-  return ((acc[0] + acc[2]) + (acc[1] + acc[3])) + rest;
+  return ((acc[0] + acc[2]) + (acc[1] + acc[3])) + TailProducts(taps, x, num_taps);
 }
 
 // Complex samples: the taps are stored duplicated (t0, t0, t1, t1, ...) so
@@ -182,21 +186,8 @@ inline __attribute__((always_inline)) Float4 DotLanes(const Float4* taps, const 
       sums[l] = m > 0 ? even[l] + odd[l] : zero;
     }
   }
-  const int tail = n & ~3;
-  Float4 rest = zero;
-  switch (n - tail) {
-    case 3:
-      rest = taps[tail] * x[tail] + (taps[tail + 1] * x[tail + 1] + taps[tail + 2] * x[tail + 2]);
-      break;
-    case 2:
-      rest = taps[tail] * x[tail] + taps[tail + 1] * x[tail + 1];
-      break;
-    case 1:
-      rest = taps[tail] * x[tail];
-      break;
-  }
-  const Float4 sum = ((sums[0] + sums[2]) + (sums[1] + sums[3])) + rest;
-  return tail == n ? sum : sum + zero;
+  const Float4 sum = ((sums[0] + sums[2]) + (sums[1] + sums[3])) + TailProducts(taps, x, n);
+  return n % 4 == 0 ? sum : sum + zero;
 }
 
 // What a four-lane group needs to know of the resampler.
