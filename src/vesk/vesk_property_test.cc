@@ -39,6 +39,7 @@ int Exercise(const audio_modem::FuzzModemConfig& f, uint32_t seed) {
   std::mt19937 random(seed);
   options.poll_interval_seconds = std::uniform_real_distribution<double>(0.01, 1.0)(random);
   options.hold_seconds = random() % 2 == 0 ? 0.0 : 3.0;
+  options.narrowband_excision = static_cast<int>(random() % 2);
 
   std::vector<int16_t> audio;
   vesk_encoder* encoder = nullptr;
