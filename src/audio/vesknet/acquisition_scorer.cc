@@ -81,16 +81,14 @@ AcquisitionScorer::AcquisitionScorer(const std::vector<float>& reference,
   CHECK(num_shifts_ > 0);
   chunk_length_ = (frame_size_ + num_chunks_ - 1) / num_chunks_;
   row_stride_ = RowStride(num_shifts_);
-  if (kernel == Kernel::kWidest) {
-    kernel = KernelAvailable(Kernel::kSixteenLane) ? Kernel::kSixteenLane
-             : KernelAvailable(Kernel::kEightLane) ? Kernel::kEightLane
-                                                   : Kernel::kFourLane;
+  kernel_ = kernel;
+  if (kernel_ == Kernel::kWidest) {
+    kernel_ = KernelAvailable(Kernel::kSixteenLane) ? Kernel::kSixteenLane : Kernel::kEightLane;
   }
-  lanes_ = !KernelAvailable(kernel)         ? 12
-           : kernel == Kernel::kSixteenLane ? 48
-           : kernel == Kernel::kEightLane   ? 24
-                                            : 12;
-  const int width = lanes_ / 3;
+  if (!KernelAvailable(kernel_)) kernel_ = Kernel::kFourLane;
+  // Three vectors per part.
+  const int width = kernel_ == Kernel::kSixteenLane ? 16 : kernel_ == Kernel::kEightLane ? 8 : 4;
+  lanes_ = 3 * width;
 
   // MakePhasorMatrix builds shifts x chunks; row s is this shift's phasor
   // over the chunks.
@@ -334,12 +332,16 @@ bool AcquisitionScorer::KernelAvailable(Kernel kernel) {
 #endif
 
 void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int count) {
-  if (lanes_ == 48) {
-    ScoreLanesSixteen(real, imag);
-  } else if (lanes_ == 24) {
-    ScoreLanesEight(real, imag);
-  } else {
-    ScoreLanesFour(real, imag);
+  switch (kernel_) {
+    case Kernel::kSixteenLane:
+      ScoreLanesSixteen(real, imag);
+      break;
+    case Kernel::kEightLane:
+      ScoreLanesEight(real, imag);
+      break;
+    default:
+      ScoreLanesFour(real, imag);
+      break;
   }
   // Only the positions asked for: the others' slots may still hold history.
   for (int lane = 0; lane < count; ++lane) {

@@ -150,7 +150,8 @@ class AcquisitionScorer {
   int num_chunks_;
   int chunk_length_;
   int row_stride_;  // S rounded up to a multiple of 16.
-  int lanes_;       // 12, 24 or 48.
+  Kernel kernel_;   // One the processor runs (never kWidest).
+  int lanes_;       // 12, 24 or 48: three vectors of the kernel's width.
   std::vector<float> reference_;
   // Phasor of shift s at chunk k: (phasor_real_, phasor_imag_)[s * C + k].
   std::vector<float> phasor_real_;
