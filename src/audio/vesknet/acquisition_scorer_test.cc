@@ -12,6 +12,10 @@
 #include "audio/vesknet/vesknet_util.h"
 #include "gtest/gtest.h"
 
+#if defined(__x86_64__) || defined(__i386__)
+#include <xmmintrin.h>
+#endif
+
 namespace audio_vesknet {
 namespace {
 
@@ -146,6 +150,34 @@ TEST(AcquisitionScorerTest, KernelWidthFollowsTheProcessor) {
   EXPECT_EQ(lanes(Kernel::kWidest),
             std::max(lanes(Kernel::kEightLane), lanes(Kernel::kSixteenLane)));
 }
+
+#if defined(__x86_64__) || defined(__i386__)
+// The 32-bit build resets the wide registers' state after each wide kernel,
+// reloading the SSE control register on the way: the rounding and
+// flush-to-zero settings a host has chosen must come back unchanged.
+TEST(AcquisitionScorerTest, ScoringKeepsTheFloatingPointControlState) {
+  using Kernel = AcquisitionScorer::Kernel;
+  const std::vector<float> code = Code(5);
+  const int f = static_cast<int>(code.size());
+  const Signal signal = MakeSignal(code, 6 * f, {f}, 0.5f, 0.5f, 3);
+  constexpr unsigned kFlushToZero = 1u << 15, kDenormalsAreZero = 1u << 6;
+  constexpr unsigned kRoundDown = 1u << 13;
+  constexpr unsigned kExceptionFlags = 0x3f;  // Sticky, set by the arithmetic.
+  const unsigned saved = _mm_getcsr();
+  for (const Kernel kernel : {Kernel::kFourLane, Kernel::kEightLane, Kernel::kSixteenLane}) {
+    AcquisitionScorer scorer(code, kShifts, 4, 20.0f, 100, kernel);
+    const unsigned chosen =
+        (saved & ~kExceptionFlags) | kFlushToZero | kDenormalsAreZero | kRoundDown;
+    _mm_setcsr(chosen);
+    std::vector<float> scores;
+    scorer.ComputeScores(signal.real, signal.imag, &scores);
+    const unsigned after = _mm_getcsr();
+    _mm_setcsr(saved);
+    EXPECT_EQ(after & ~kExceptionFlags, chosen) << static_cast<int>(kernel);
+    EXPECT_FALSE(scores.empty());
+  }
+}
+#endif
 
 TEST(AcquisitionScorerTest, GeometryFollowsTheConfiguration) {
   const std::vector<float> reference(100, 1.0f);
