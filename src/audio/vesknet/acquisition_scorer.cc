@@ -372,10 +372,32 @@ void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int cou
       ScoreLanesFour(real, imag);
       break;
   }
+  // Into the history (a row of shifts per position, where the block holds a
+  // row of positions per shift), four positions by four shifts at a time.
   // Only the positions asked for: the others' slots may still hold history.
-  for (int lane = 0; lane < count; ++lane) {
+  using audio_dsp::Float4;
+  const float* block = block_energies_.data();
+  const int stride = lanes_;
+  const int num_shifts = num_shifts_;
+  const int whole_shifts = num_shifts & ~3;
+  int lane = 0;
+  for (; lane + 4 <= count; lane += 4) {
+    float* rows[4];
+    for (int j = 0; j < 4; ++j) rows[j] = Energies(positions_scored_ + lane + j);
+    const float* column = block + lane;
+    for (int s = 0; s < whole_shifts; s += 4, column += 4 * stride) {
+      Float4 square[4];
+      for (int i = 0; i < 4; ++i) square[i] = audio_dsp::Load4(column + i * stride);
+      audio_dsp::Transpose4(square);
+      for (int j = 0; j < 4; ++j) audio_dsp::Store4(rows[j] + s, square[j]);
+    }
+    for (int s = whole_shifts; s < num_shifts; ++s, column += stride) {
+      for (int j = 0; j < 4; ++j) rows[j][s] = column[j];
+    }
+  }
+  for (; lane < count; ++lane) {
     float* energies = Energies(positions_scored_ + lane);
-    for (int s = 0; s < num_shifts_; ++s) energies[s] = block_energies_[s * lanes_ + lane];
+    for (int s = 0; s < num_shifts; ++s) energies[s] = block[s * stride + lane];
   }
 }
 
