@@ -26,8 +26,7 @@ std::vector<FoundToken> StreamDecoder::Feed(const int16_t* samples, int64_t coun
       raw_.assign(samples + start, samples + start + n);
       decoder_->ProcessSamplesWithZintar(raw_.data(), static_cast<int>(n));
     } else {
-      floats_.assign(samples + start, samples + start + n);
-      decoder_->ProcessSamples(floats_);
+      decoder_->ProcessPcm16(samples + start, static_cast<int>(n));
     }
     frames_fed_ += n / channels_;
     if (frames_fed_ >= next_request_frame_) {
@@ -51,11 +50,12 @@ std::vector<FoundToken> StreamDecoder::Finish() {
 
 void StreamDecoder::Request(std::vector<FoundToken>* found) {
   const double now = time_s();
-  const bool broadcaster = decoder_->DetectBroadcaster();
-  ++broadcaster_answers_;
-  if (broadcaster) {
-    ++positive_broadcaster_answers_;
-    if (broadcaster_time_s_ < 0) broadcaster_time_s_ = now;
+  if (options_.detect_broadcaster) {
+    ++broadcaster_answers_;
+    if (decoder_->DetectBroadcaster()) {
+      ++positive_broadcaster_answers_;
+      if (broadcaster_time_s_ < 0) broadcaster_time_s_ = now;
+    }
   }
   audio_modem::DecodeResults results;
   if (!decoder_->GetTokens(&results, message_bytes_, crc_check_bytes_)) return;

@@ -23,6 +23,9 @@ struct StreamDecodingOptions {
   // A token is reported again only after this long without being heard.
   double repeat_hold_s = 3.0;
   bool zintar = false;  // Feed the raw samples to the listening mode.
+  // Ask DetectBroadcaster at every request, as a host that shows it does
+  // (broadcaster_time_s() and the answer counts stay at -1 and 0 without).
+  bool detect_broadcaster = true;
 };
 
 class StreamDecoder {
@@ -69,7 +72,6 @@ class StreamDecoder {
   int broadcaster_answers_ = 0;
   int positive_broadcaster_answers_ = 0;
   std::vector<FoundToken> recent_;  // Reported tokens and when last heard.
-  std::vector<float> floats_;
   std::vector<int16_t> raw_;
 };
 

@@ -1,6 +1,7 @@
 #include "tools/common/stream_decoding.h"
 
 #include <cstdint>
+#include <memory>
 #include <vector>
 
 #include "audio/dsp/pcm_conversion.h"
@@ -70,6 +71,44 @@ TEST(StreamDecodingTest, ARepeatedTokenIsReportedOncePerSighting) {
   EXPECT_EQ(found[0].bytes, kMessage);
   EXPECT_EQ(found[1].bytes, kMessage);
   EXPECT_GT(found[1].time_s - found[0].time_s, 2.5);
+}
+
+// A whole stream through a fresh decoder, and what it found.
+struct StreamRun {
+  std::unique_ptr<audio_modem::AudioModemDecoder> decoder;
+  std::unique_ptr<StreamDecoder> stream;
+  std::vector<FoundToken> found;
+};
+StreamRun Decode(const std::vector<int16_t>& pcm, const StreamDecodingOptions& options) {
+  StreamRun run;
+  run.decoder = Decoder();
+  run.stream = std::make_unique<StreamDecoder>(run.decoder.get(), 48000, 1, 6, 2, options);
+  run.found = run.stream->Feed(pcm.data(), static_cast<int64_t>(pcm.size()));
+  for (const FoundToken& token : run.stream->Finish()) run.found.push_back(token);
+  return run;
+}
+
+TEST(StreamDecodingTest, BroadcasterAnswersOnlyWhenAsked) {
+  const std::vector<int16_t> pcm = ProductToken(3);
+  StreamDecodingOptions options;
+  const StreamRun asking = Decode(pcm, options);
+  options.detect_broadcaster = false;
+  const StreamRun silent = Decode(pcm, options);
+  // One answer per request: every 0.25 s of the input and the flush, and one
+  // more at the end.
+  const int requests =
+      static_cast<int>((pcm.size() / 48000.0 + StreamDecoder::kFlushSeconds) / 0.25) + 1;
+  EXPECT_EQ(asking.stream->broadcaster_answers(), requests);
+  EXPECT_GT(asking.stream->positive_broadcaster_answers(), 0);
+  EXPECT_GE(asking.stream->broadcaster_time_s(), 0.0);
+  EXPECT_EQ(silent.stream->broadcaster_answers(), 0);
+  EXPECT_EQ(silent.stream->positive_broadcaster_answers(), 0);
+  EXPECT_EQ(silent.stream->broadcaster_time_s(), -1.0);
+  // The tokens do not depend on it.
+  ASSERT_EQ(asking.found.size(), 1u);
+  ASSERT_EQ(silent.found.size(), 1u);
+  EXPECT_EQ(silent.found[0].bytes, asking.found[0].bytes);
+  EXPECT_EQ(silent.found[0].time_s, asking.found[0].time_s);
 }
 
 }  // namespace

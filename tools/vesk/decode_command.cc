@@ -111,6 +111,9 @@ ParseOutcome ParseDecodeArgs(const std::vector<std::string>& args, DecodeRequest
   DecodeRequest& r = *request;
   r.dtmf = WantsDtmf(args);
   r.message_bytes = r.dtmf ? 5 : 6;
+  // The command prints tokens only: the broadcaster answer (a few percent of
+  // the decoding cost) would go unused.
+  r.stream.detect_broadcaster = false;
   bool raw = false;
   DsssOptions dsss;
   DtmfOptions dtmf;
