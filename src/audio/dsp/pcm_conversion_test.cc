@@ -36,6 +36,15 @@ TEST(PcmConversionTest, SixteenBitValuesBecomeUnscaledFloats) {
   std::vector<float> samples = {9, 9, 9, 9, 9, 9};
   Pcm16ToFloats(reinterpret_cast<const int16_t*>(bytes + 1), 4, &samples);
   EXPECT_EQ(samples, (std::vector<float>{-32768, 32767, 1, -1}));
+  // Every value, in a count that leaves a tail after the groups of four.
+  std::vector<int16_t> all;
+  for (int v = -32768; v <= 32767; ++v) all.push_back(static_cast<int16_t>(v));
+  all.push_back(-2);
+  all.push_back(3);
+  all.push_back(-32768);
+  Pcm16ToFloats(all.data(), static_cast<int>(all.size()), &samples);
+  ASSERT_EQ(samples.size(), all.size());
+  for (size_t i = 0; i < all.size(); ++i) ASSERT_EQ(samples[i], all[i]) << i;
 }
 
 }  // namespace

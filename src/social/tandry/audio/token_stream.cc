@@ -129,8 +129,7 @@ void TokenStream::FeedBlock(const int16_t* samples, size_t count) {
       raw_.assign(samples + start, samples + start + n);
       decoder_->ProcessSamplesWithZintar(raw_.data(), static_cast<int>(n));
     } else {
-      floats_.assign(samples + start, samples + start + n);
-      decoder_->ProcessSamples(floats_);
+      decoder_->ProcessPcm16(samples + start, static_cast<int>(n));
     }
   }
 }

@@ -113,7 +113,6 @@ class TokenStream {
   std::deque<StreamToken> queue_;
   std::vector<StreamToken> recent_;  // Reported tokens and when last heard.
   DecodeResults results_;
-  std::vector<float> floats_;
   std::vector<int16_t> raw_;
 };
 
