@@ -383,15 +383,19 @@ void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int cou
   int lane = 0;
   for (; lane + 4 <= count; lane += 4) {
     float* rows[4];
+#pragma GCC unroll 4
     for (int j = 0; j < 4; ++j) rows[j] = Energies(positions_scored_ + lane + j);
     const float* column = block + lane;
     for (int s = 0; s < whole_shifts; s += 4, column += 4 * stride) {
       Float4 square[4];
+#pragma GCC unroll 4
       for (int i = 0; i < 4; ++i) square[i] = audio_dsp::Load4(column + i * stride);
       audio_dsp::Transpose4(square);
+#pragma GCC unroll 4
       for (int j = 0; j < 4; ++j) audio_dsp::Store4(rows[j] + s, square[j]);
     }
     for (int s = whole_shifts; s < num_shifts; ++s, column += stride) {
+#pragma GCC unroll 4
       for (int j = 0; j < 4; ++j) rows[j][s] = column[j];
     }
   }
