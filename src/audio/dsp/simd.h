@@ -13,6 +13,10 @@
 
 #include <cstring>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 namespace audio_dsp {
 
 typedef float Float4 __attribute__((vector_size(16)));
@@ -29,7 +33,20 @@ inline Float4 Load4(const float* p) {
 inline void Store4(float* p, Float4 v) { std::memcpy(p, &v, sizeof(v)); }
 
 // Lanes 0, 1 and lanes 2, 3 of v, widened to double (exactly). (No eight-byte
-// vector types here: the 32-bit build handles those badly.)
+// vector types here: the 32-bit build handles those badly. With SSE2 the
+// conversion instructions directly: GCC builds these from single lanes.)
+#if defined(__SSE2__)
+inline Double2 LowToDouble(Float4 v) { return reinterpret_cast<Double2>(_mm_cvtps_pd(v)); }
+inline Double2 HighToDouble(Float4 v) {
+  return reinterpret_cast<Double2>(_mm_cvtps_pd(_mm_movehl_ps(v, v)));
+}
+
+// (low[0], low[1], high[0], high[1]), each rounded to float.
+inline Float4 ToFloat4(Double2 low, Double2 high) {
+  return _mm_movelh_ps(_mm_cvtpd_ps(reinterpret_cast<__m128d>(low)),
+                       _mm_cvtpd_ps(reinterpret_cast<__m128d>(high)));
+}
+#else
 inline Double2 LowToDouble(Float4 v) { return Double2{v[0], v[1]}; }
 inline Double2 HighToDouble(Float4 v) { return Double2{v[2], v[3]}; }
 
@@ -38,6 +55,7 @@ inline Float4 ToFloat4(Double2 low, Double2 high) {
   return Float4{static_cast<float>(low[0]), static_cast<float>(low[1]), static_cast<float>(high[0]),
                 static_cast<float>(high[1])};
 }
+#endif
 
 // Lane-wise std::max(a, b) and std::min(a, b): the same comparisons, so the
 // same results, NaN included.

@@ -22,6 +22,24 @@ TEST(SimdTest, Transpose4) {
 
 // Lane by lane what std::max and std::min give, also for a NaN on either
 // side and for zeros of both signs.
+// Widening is exact and lane-preserving; narrowing rounds each lane as a
+// static_cast does (to nearest, ties to even).
+TEST(SimdTest, DoubleConversionsKeepTheLanes) {
+  const Float4 v = {1.5f, -2.25f, 3.0e38f, -1.0e-40f};  // The last is subnormal.
+  const Double2 low = LowToDouble(v), high = HighToDouble(v);
+  EXPECT_EQ(low[0], 1.5);
+  EXPECT_EQ(low[1], -2.25);
+  EXPECT_EQ(high[0], static_cast<double>(3.0e38f));
+  EXPECT_EQ(high[1], static_cast<double>(-1.0e-40f));
+  const Double2 a = {1.0 + 0x1p-24, 1.0 + 0x1p-23 + 0x1p-24};  // Ties: down, up.
+  const Double2 b = {1.0 / 3.0, -1e300};
+  const Float4 narrowed = ToFloat4(a, b);
+  EXPECT_EQ(narrowed[0], 1.0f);
+  EXPECT_EQ(narrowed[1], 1.0f + 0x1p-22f);
+  EXPECT_EQ(narrowed[2], static_cast<float>(1.0 / 3.0));
+  EXPECT_EQ(narrowed[3], -std::numeric_limits<float>::infinity());
+}
+
 TEST(SimdTest, MaxAndMinAreStdMaxAndMin) {
   const float nan = std::numeric_limits<float>::quiet_NaN();
   const Float4 a = {1.0f, nan, 2.0f, -0.0f};
