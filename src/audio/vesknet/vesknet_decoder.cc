@@ -339,13 +339,24 @@ void VesknetDecoder::ScoreSymbols(const std::vector<float>& baseband_real_extend
   CHECK(baseband_imaginary_extended_frame.size() == extended_size);
   CHECK(symbol_scores);
 
-  // Despread and taper.
+  // Despread and taper, four samples at a time into interleaved pairs.
   std::vector<std::complex<float>>& frame = despread_;
   frame.resize(extended_size);
-  for (int n = 0; n < extended_size; ++n) {
-    const float gain = despread_gain_[n];
-    frame[n] = std::complex<float>(baseband_real_extended_frame[n] * gain,
-                                   baseband_imaginary_extended_frame[n] * gain);
+  {
+    const float* real = baseband_real_extended_frame.data();
+    const float* imag = baseband_imaginary_extended_frame.data();
+    const float* gain = despread_gain_.data();
+    float* out = reinterpret_cast<float*>(frame.data());
+    int n = 0;
+    for (; n + 4 <= extended_size; n += 4) {
+      const audio_dsp::Float4 g = audio_dsp::Load4(gain + n);
+      const audio_dsp::Float4 re = audio_dsp::Load4(real + n) * g;
+      const audio_dsp::Float4 im = audio_dsp::Load4(imag + n) * g;
+      audio_dsp::Store4(out + 2 * n, __builtin_shufflevector(re, im, 0, 4, 1, 5));
+      audio_dsp::Store4(out + 2 * n + 4, __builtin_shufflevector(re, im, 2, 6, 3, 7));
+    }
+    for (; n < extended_size; ++n)
+      frame[n] = std::complex<float>(real[n] * gain[n], imag[n] * gain[n]);
   }
 
   // The Doppler shift that best lines up the chunk sums of the whole
