@@ -244,6 +244,7 @@ std::unique_ptr<AudioInput> AudioInput::Open(std::unique_ptr<ByteSource> source,
       // Streamed headers may announce any length: only a file's is known.
       input->frames_ = bytes->Length() >= 0 ? info.frames : -1;
       input->float_samples_ = IsFloatCodec(info.format & SF_FORMAT_SUBMASK);
+      input->pcm16_samples_ = (info.format & SF_FORMAT_SUBMASK) == SF_FORMAT_PCM_16;
       input->format_ = FormatName(info.format & SF_FORMAT_TYPEMASK) + ", " +
                        FormatName(info.format & SF_FORMAT_SUBMASK);
       bytes->ForgetPast();
@@ -309,6 +310,10 @@ int64_t AudioInput::ReadDecoded(int64_t max_frames, std::vector<int16_t>* sample
       if (!(std::fabs(x) <= 1.0f)) ++clipped_samples_;
       (*samples)[i] = audio_dsp::FloatToPcm16(x);
     }
+  } else if (pcm16_samples_) {
+    samples->resize(count);
+    frames = sf_readf_short(sndfile_, samples->data(), max_frames);
+    samples->resize(static_cast<size_t>(frames * channels_));
   } else {
     // Integers arrive left-aligned in 32 bits: the top half is the 16-bit sample.
     ints_.resize(count);

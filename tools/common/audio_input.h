@@ -119,6 +119,7 @@ class AudioInput {
   std::unique_ptr<ByteSource> source_;
   sf_private_tag* sndfile_ = nullptr;  // libsndfile's SNDFILE, or null for raw input.
   bool float_samples_ = false;
+  bool pcm16_samples_ = false;  // 16-bit PCM: read as it is.
   int sample_rate_ = 0;
   int channels_ = 0;
   int64_t frames_ = -1;

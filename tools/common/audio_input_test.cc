@@ -66,6 +66,8 @@ TEST(AudioInputTest, IntegerPcmKeepsItsTop16Bits) {
             (std::vector<int16_t>{0, 32512, -32768, 256}));
   EXPECT_EQ(Read(Wav(kPcm, 1, 8000, 16, {0x01, 0x02, 0xFF, 0xFF})).samples,
             (std::vector<int16_t>{0x0201, -1}));
+  EXPECT_EQ(Read(Wav(kPcm, 2, 8000, 16, {0x00, 0x80, 0xFF, 0x7F, 0x34, 0x12, 0x00, 0x00})).samples,
+            (std::vector<int16_t>{-32768, 32767, 0x1234, 0}));
   // 24 and 32 bits: an arithmetic shift, so -1 stays -1 (rounded down).
   EXPECT_EQ(
       Read(Wav(kPcm, 1, 8000, 24, {0x56, 0x34, 0x12, 0xFF, 0xFF, 0xFF, 0x00, 0x00, 0x80})).samples,
