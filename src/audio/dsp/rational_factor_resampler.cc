@@ -101,12 +101,55 @@ inline void PartialSumsOfGroup(const float* const* a, const float* const* b, int
   for (int j = 0; j < kCount; ++j) sums[j] = acc0[j] + acc1[j];
 }
 
+#if defined(__x86_64__) || defined(__i386__)
+#define VESK_WIDE_RESAMPLER 1
+#endif
+
+typedef float Float8 __attribute__((vector_size(32)));
+
+// PartialSumsOfGroup with eight-lane products: lanes 0 to 3 of an
+// accumulator are acc0 and lanes 4 to 7 are acc1, so every lane adds the
+// same products in the same order. Compiled for AVX only where it is inlined
+// into a function built for it (elsewhere GCC splits the vectors in two).
+template <int kCount>
+inline __attribute__((always_inline)) void PartialSumsOfGroupEight(const float* const* a,
+                                                                   const float* const* b, int n,
+                                                                   Float4* sums) {
+  Float8 acc[kCount];
+#pragma GCC unroll 4
+  for (int j = 0; j < kCount; ++j) acc[j] = Float8{};
+  int m = 0;
+  for (; m + 8 <= n; m += 8) {
+#pragma GCC unroll 4
+    for (int j = 0; j < kCount; ++j) {
+      Float8 x, y;
+      std::memcpy(&x, a[j] + m, sizeof(x));
+      std::memcpy(&y, b[j] + m, sizeof(y));
+      acc[j] += x * y;
+    }
+  }
+#pragma GCC unroll 4
+  for (int j = 0; j < kCount; ++j) {
+    const Float4 acc0 = __builtin_shufflevector(acc[j], acc[j], 0, 1, 2, 3);
+    Float4 acc1 = __builtin_shufflevector(acc[j], acc[j], 4, 5, 6, 7);
+    if (m + 4 <= n) acc1 += Load4(a[j] + m) * Load4(b[j] + m);
+    sums[j] = acc0 + acc1;
+  }
+}
+
 // Four real outputs at once, out[j] = Dot(taps[j], x[j], num_taps) exactly:
 // the partial sums of the four are transposed so that one vector step does
-// their four horizontal sums, each in Dot's order.
-inline void DotGroup(const float* const* taps, const float* const* x, int num_taps, float* out) {
+// their four horizontal sums, each in Dot's order. kWide sums the products
+// in eight lanes, with the same result.
+template <bool kWide>
+inline __attribute__((always_inline)) void DotGroup(const float* const* taps, const float* const* x,
+                                                    int num_taps, float* out) {
   Float4 lanes[4];
-  PartialSumsOfGroup<4>(taps, x, num_taps, lanes);
+  if constexpr (kWide) {
+    PartialSumsOfGroupEight<4>(taps, x, num_taps, lanes);
+  } else {
+    PartialSumsOfGroup<4>(taps, x, num_taps, lanes);
+  }
   Transpose4(lanes);  // lanes[l]: lane l of each output's partial sums.
   const int tail = num_taps & ~3;
   Float4 rest = {0.0f, 0.0f, 0.0f, 0.0f};
@@ -133,13 +176,20 @@ inline void DotGroup(const float* const* taps, const float* const* x, int num_ta
   Store4(out, ((lanes[0] + lanes[2]) + (lanes[1] + lanes[3])) + rest);
 }
 
-// Two complex outputs at once, exactly as Dot computes each.
-inline void DotGroup(const float* const* doubled_taps, const std::complex<float>* const* x,
-                     int num_taps, std::complex<float>* out) {
+// Two complex outputs at once, exactly as Dot computes each; kWide sums the
+// products in eight lanes, with the same result.
+template <bool kWide>
+inline __attribute__((always_inline)) void DotGroup(const float* const* doubled_taps,
+                                                    const std::complex<float>* const* x,
+                                                    int num_taps, std::complex<float>* out) {
   const int n = 2 * num_taps;
   const float* xf[2] = {reinterpret_cast<const float*>(x[0]), reinterpret_cast<const float*>(x[1])};
   Float4 sums[2];
-  PartialSumsOfGroup<2>(doubled_taps, xf, n, sums);
+  if constexpr (kWide) {
+    PartialSumsOfGroupEight<2>(doubled_taps, xf, n, sums);
+  } else {
+    PartialSumsOfGroup<2>(doubled_taps, xf, n, sums);
+  }
   // (re, im) of both: lanes 0 + 2 and 1 + 3 of each.
   Float4 both = __builtin_shufflevector(sums[0], sums[1], 0, 1, 4, 5) +
                 __builtin_shufflevector(sums[0], sums[1], 2, 3, 6, 7);
@@ -241,11 +291,62 @@ constexpr int kFloatsPerTap<std::complex<float>> = 2;
 template <typename T>
 constexpr int kGroupSize = 4 / kFloatsPerTap<T>;
 
+// Where the outputs have got to: the next output, its window's start in
+// the stream of buffered and new samples, and its phase.
+struct Walk {
+  int64_t k;
+  int64_t s;
+  int phase;
+};
+
+// The outputs from walk->k on, up to the last whole group before `count`,
+// computed by groups of neighbours (as many as fill a vector) from the new
+// samples `input` (window starts count from the num_buffered samples held
+// before them, which no window here reaches). Advances *walk past them.
+template <bool kWide, typename T>
+inline __attribute__((always_inline)) void NeighbourGroups(const LaneGeometry& g,
+                                                           const float* filters, const T* input,
+                                                           int64_t num_buffered, int64_t count,
+                                                           Walk* walk, T* out) {
+  constexpr int kGroup = kGroupSize<T>;
+  const size_t filter_stride = static_cast<size_t>(g.num_taps) * kFloatsPerTap<T>;
+  int64_t k = walk->k, s = walk->s;
+  int phase = walk->phase;
+  const float* group_taps[kGroup];
+  const T* group_input[kGroup];
+  for (; k + kGroup <= count; k += kGroup) {
+#pragma GCC unroll 4
+    for (int j = 0; j < kGroup; ++j) {
+      group_taps[j] = filters + phase * filter_stride;
+      group_input[j] = input + (s - num_buffered);
+      s += g.step;
+      phase += g.phase_increment;
+      if (phase >= g.denominator) {
+        phase -= g.denominator;
+        ++s;
+      }
+    }
+    DotGroup<kWide>(group_taps, group_input, g.num_taps, out + k);
+  }
+  *walk = {k, s, phase};
+}
+
+// NeighbourGroups in eight-lane vectors, for processors with AVX. (No FMA:
+// fused products would round differently.) Elsewhere never called.
+template <typename T>
+#ifdef VESK_WIDE_RESAMPLER
+__attribute__((target("avx")))
+#endif
+void NeighbourGroupsWide(const LaneGeometry& g, const float* filters, const T* input,
+                         int64_t num_buffered, int64_t count, Walk* walk, T* out) {
+  NeighbourGroups<true>(g, filters, input, num_buffered, count, walk, out);
+}
+
 }  // namespace
 
 template <typename T>
 RationalFactorResampler<T>::RationalFactorResampler(const ResamplingKernel& kernel,
-                                                    int max_denominator) {
+                                                    int max_denominator, bool wide_vectors) {
   if (max_denominator < 1 || !kernel.Valid()) return;
   const double ratio = kernel.input_sample_rate() / kernel.output_sample_rate();
   if (!(ratio < kMaxRatio) || !(kernel.radius() < kMaxRatio)) return;
@@ -282,6 +383,11 @@ RationalFactorResampler<T>::RationalFactorResampler(const ResamplingKernel& kern
       lane_input_.resize(static_cast<size_t>(stretch));
     }
   }
+#ifdef VESK_WIDE_RESAMPLER
+  wide_ = wide_vectors && __builtin_cpu_supports("avx");
+#else
+  (void)wide_vectors;
+#endif
   buffer_.reserve(2 * num_taps_);
   flush_zeros_.assign(2 * radius_, T(0));
   valid_ = true;
@@ -349,22 +455,22 @@ void RationalFactorResampler<T>::ProcessSamples(const std::vector<T>& input,
       }
     }
   }
-  constexpr int kGroup = kGroupSize<T>;
-  const float* group_taps[kGroup];
-  const T* group_input[kGroup];
-  for (; k + kGroup <= count; k += kGroup) {
-#pragma GCC unroll 4
-    for (int j = 0; j < kGroup; ++j) {
-      group_taps[j] = filters + phase * filter_stride;
-      group_input[j] = input.data() + (s - num_buffered);
-      s += step_;
-      phase += phase_increment_;
-      if (phase >= denominator_) {
-        phase -= denominator_;
-        ++s;
-      }
+  {
+    LaneGeometry geometry;
+    geometry.num_taps = num_taps;
+    geometry.step = step_;
+    geometry.phase_increment = phase_increment_;
+    geometry.denominator = denominator_;
+    Walk walk = {k, s, phase};
+    if (wide_) {
+      NeighbourGroupsWide(geometry, filters, input.data(), num_buffered, count, &walk, out);
+      ClearUpperVectorState();
+    } else {
+      NeighbourGroups<false>(geometry, filters, input.data(), num_buffered, count, &walk, out);
     }
-    DotGroup(group_taps, group_input, num_taps, out + k);
+    k = walk.k;
+    s = walk.s;
+    phase = walk.phase;
   }
   for (; k < count; ++k) {
     out[k] = Dot(filters + phase * filter_stride, input.data() + (s - num_buffered), num_taps);

@@ -37,6 +37,10 @@ namespace audio_dsp {
 // exactly as the one-output code does (the output does not depend on which
 // path computed it). 48 kHz to 44.1 kHz: q = 147, groups of 588 outputs.
 //
+// Outputs outside those groups are computed two (complex) or four (real)
+// neighbours at a time, in eight-lane vectors on x86 processors with AVX
+// (chosen at run time; with the same result, lane for lane).
+//
 // Allocation happens at construction; ProcessSamples() allocates only when
 // the output vector has to grow. Instantiated for T = float and
 // T = std::complex<float> (real taps times T). Not thread-safe.
@@ -47,7 +51,10 @@ class RationalFactorResampler : public Resampler<T> {
   // (check Valid()) when max_denominator < 1, when the kernel is invalid, or
   // when the rate ratio is unusable (p / q of 0, a ratio of 2^16 or more, or a
   // kernel too narrow for the decimation: p / q > 2 * radius()).
-  RationalFactorResampler(const ResamplingKernel& kernel, int max_denominator);
+  // `wide_vectors` false keeps to four-lane vectors even where AVX is
+  // available (for comparisons).
+  RationalFactorResampler(const ResamplingKernel& kernel, int max_denominator,
+                          bool wide_vectors = true);
   RationalFactorResampler(const RationalFactorResampler&) = delete;
   RationalFactorResampler& operator=(const RationalFactorResampler&) = delete;
   ~RationalFactorResampler() override = default;
@@ -68,6 +75,8 @@ class RationalFactorResampler : public Resampler<T> {
   int denominator() const { return denominator_; }  // q, number of filter phases
   int radius() const { return radius_; }            // input samples
   int num_taps() const { return num_taps_; }
+  // Whether neighbouring outputs are computed in eight-lane vectors.
+  bool wide() const { return wide_; }
 
  private:
   bool valid_ = false;
@@ -77,6 +86,7 @@ class RationalFactorResampler : public Resampler<T> {
   int phase_increment_ = 0;  // p mod q
   int radius_ = 0;
   int num_taps_ = 0;
+  bool wide_ = false;
   // q filters of num_taps_ taps, phase after phase; for complex T every tap
   // is stored twice in a row to match the interleaved samples.
   std::vector<float> filters_;

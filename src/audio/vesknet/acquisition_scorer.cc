@@ -18,7 +18,6 @@
 // AVX-512, chosen at run time.
 #if defined(__x86_64__) || defined(__i386__)
 #define VESK_WIDE_KERNELS 1
-#include <immintrin.h>
 #endif
 
 namespace audio_vesknet {
@@ -58,32 +57,6 @@ double NoisePole(float noise_length) {
   return 1.0 + (1.0 - std::sqrt(2.0 * q + 1.0)) / q;
 }
 int NoiseDelay(double pole) { return static_cast<int>(std::round(2.0 * pole / (1.0 - pole))); }
-
-#ifdef __i386__
-// Returns the AVX and AVX-512 registers' upper parts to their initial state.
-// VZEROUPPER, which the wide kernels end with, reaches only registers 0 to 7
-// in 32-bit code, and some processors (AMD Zen 4 here) then keep the upper
-// state marked as in use: every SSE instruction that writes a register after
-// that merges with the upper bits, and the SSE code between the wide kernels
-// (the smoother, the resampler, the position scoring) ran 2 to 3 times
-// slower. XRSTOR with those components flagged absent from the (zeroed) save
-// area sets them to their initial state; it also reloads MXCSR from the
-// area, so the current one goes there. About 400 cycles a call. Only called
-// after a wide kernel ran, which implies that the system saves AVX state and
-// so has XSAVE enabled.
-__attribute__((target("xsave"))) void ClearUpperVectorState() {
-  constexpr unsigned kAvxComponents = (1u << 2) | (1u << 5) | (1u << 6) | (1u << 7);
-  constexpr int kMxcsrOffset = 24;           // in the legacy region
-  alignas(64) unsigned char area[576] = {};  // legacy region, then a zero header
-  const unsigned mxcsr = _mm_getcsr();
-  std::memcpy(area + kMxcsrOffset, &mxcsr, sizeof(mxcsr));
-  _xrstor(area, kAvxComponents);
-}
-#else
-// Elsewhere the wide kernels' VZEROUPPER (64-bit x86) is enough, or there are
-// no wide kernels.
-inline void ClearUpperVectorState() {}
-#endif
 
 }  // namespace
 
@@ -362,11 +335,11 @@ void AcquisitionScorer::ScoreBlock(const float* real, const float* imag, int cou
   switch (kernel_) {
     case Kernel::kSixteenLane:
       ScoreLanesSixteen(real, imag);
-      ClearUpperVectorState();
+      audio_dsp::ClearUpperVectorState();
       break;
     case Kernel::kEightLane:
       ScoreLanesEight(real, imag);
-      ClearUpperVectorState();
+      audio_dsp::ClearUpperVectorState();
       break;
     default:
       ScoreLanesFour(real, imag);
