@@ -134,6 +134,25 @@ TEST(RationalFactorResamplerTest, OutputDoesNotDependOnBlocking) {
   ExpectBlockingDoesNotMatter<ComplexF>(48000, 12000);
 }
 
+// The eight partial sums of products (index mod 8) that the resampler keeps,
+// the first four and the second four paired lane by lane; the products past
+// the last whole four are left out.
+void PartialSums(const std::vector<float>& products, float sums[4]) {
+  const int n = static_cast<int>(products.size());
+  float first[4] = {0, 0, 0, 0}, second[4] = {0, 0, 0, 0};
+  int m = 0;
+  for (; m + 8 <= n; m += 8) {
+    for (int l = 0; l < 4; ++l) {
+      first[l] += products[m + l];
+      second[l] += products[m + 4 + l];
+    }
+  }
+  if (m + 4 <= n) {
+    for (int l = 0; l < 4; ++l) second[l] += products[m + l];
+  }
+  for (int l = 0; l < 4; ++l) sums[l] = first[l] + second[l];
+}
+
 // Output k computed from its definition: the window of num_taps samples of
 // the stream (radius zeros, then the input) that starts at floor(k p / q),
 // the taps kernel((radius - m) + (k p mod q) / q) rounded to float, and the
@@ -157,19 +176,8 @@ float DirectOutput(const ResamplingKernel& kernel, int p, int q, int radius,
     *exact += double(tap) * x;
     *magnitude += std::fabs(double(tap) * x);
   }
-  float first[4] = {0, 0, 0, 0}, second[4] = {0, 0, 0, 0};
-  int m = 0;
-  for (; m + 8 <= n; m += 8) {
-    for (int l = 0; l < 4; ++l) {
-      first[l] += products[m + l];
-      second[l] += products[m + 4 + l];
-    }
-  }
-  if (m + 4 <= n) {
-    for (int l = 0; l < 4; ++l) second[l] += products[m + l];
-  }
   float sums[4];
-  for (int l = 0; l < 4; ++l) sums[l] = first[l] + second[l];
+  PartialSums(products, sums);
   const float* last = products.data() + (n & ~3);
   const float rest = n % 4 == 3   ? last[0] + (last[1] + last[2])
                      : n % 4 == 2 ? last[0] + last[1]
@@ -241,19 +249,8 @@ ComplexF DirectComplexOutput(const ResamplingKernel& kernel, int p, int q, int r
     products[2 * m] = tap * x.real();
     products[2 * m + 1] = tap * x.imag();
   }
-  float first[4] = {0, 0, 0, 0}, second[4] = {0, 0, 0, 0};
-  int m = 0;
-  for (; m + 8 <= n; m += 8) {
-    for (int l = 0; l < 4; ++l) {
-      first[l] += products[m + l];
-      second[l] += products[m + 4 + l];
-    }
-  }
-  if (m + 4 <= n) {
-    for (int l = 0; l < 4; ++l) second[l] += products[m + l];
-  }
   float sums[4];
-  for (int l = 0; l < 4; ++l) sums[l] = first[l] + second[l];
+  PartialSums(products, sums);
   float re = sums[0] + sums[2], im = sums[1] + sums[3];
   if (n & 2) {
     re += products[n - 2];
