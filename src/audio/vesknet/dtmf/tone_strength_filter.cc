@@ -98,6 +98,15 @@ constexpr int kMaxPairs = 5;
 constexpr int kMaxPairs = 3;
 #endif
 
+// Two samples per pass of the mixing loop where the registers leave room for
+// it: on the 32-bit build the wider loop spilled sums and ran about 4%
+// slower than one sample per pass.
+#if defined(__i386__)
+constexpr bool kTwoSamplesPerPass = false;
+#else
+constexpr bool kTwoSamplesPerPass = true;
+#endif
+
 // round(value) half away from zero, saturated to the int32 range.
 int32_t RoundToInt32(double value) {
   const double rounded = std::round(value);
@@ -299,11 +308,13 @@ void ToneStrengthFilter::ProcessPairs(ToneStrengthFilter* filters, int lanes,
     while (remaining > 0 && completed < kGroups) {
       const int32_t run = static_cast<int32_t>(std::min<size_t>(remaining, countdown));
       int32_t j = 0;
-      for (; j + 2 <= run; j += 2) {
-        mix(samples[j]);
-        mix(samples[j + 1]);
+      if (kTwoSamplesPerPass) {
+        for (; j + 2 <= run; j += 2) {
+          mix(samples[j]);
+          mix(samples[j + 1]);
+        }
       }
-      if (j < run) mix(samples[j]);
+      for (; j < run; ++j) mix(samples[j]);
       samples += run;
       remaining -= run;
       countdown -= run;
