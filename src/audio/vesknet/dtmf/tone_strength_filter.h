@@ -39,7 +39,7 @@ class ToneStrengthFilter {
   // i's strengths to outputs[i]: exactly what calling each one's Process
   // gives. Filters that share their decimation factor and the position in
   // their group (filters reset together and fed alike) run side by side, up
-  // to ten at a time (four on targets with eight vector registers), the sine
+  // to ten at a time (six on targets with eight vector registers), the sine
   // and cosine of two filters per vector; others run one after another.
   static void ProcessAll(ToneStrengthFilter* filters, int count, const std::vector<float>& input,
                          std::vector<float>* outputs);

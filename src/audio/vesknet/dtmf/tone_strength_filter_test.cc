@@ -1,6 +1,9 @@
 #include "audio/vesknet/dtmf/tone_strength_filter.h"
 
 #include <cmath>
+#include <cstdint>
+#include <cstring>
+#include <random>
 #include <vector>
 
 #include "gtest/gtest.h"
@@ -80,6 +83,97 @@ TEST(ToneStrengthFilterTest, ProcessAllEqualsEachFiltersProcess) {
     for (int i = 0; i < count; ++i) {
       EXPECT_EQ(collected[i], expected[i]) << count << " filters, filter " << i;
       EXPECT_GE(expected[i].size(), input.size() / 16);
+    }
+  }
+}
+
+// The filter written out plainly, one sample at a time, for comparison bit
+// for bit: its own sine table (sin(i 2 pi / 4096) rounded to float, the
+// cosine a quarter period on), a 32-bit phase from half a table step whose
+// top 12 bits index the table, sums dumped every `decimation` samples into
+// two one-pole stages with the filter's gain, and |I|^2 + |Q|^2.
+class ReferenceFilter {
+ public:
+  ReferenceFilter(float sample_rate, float frequency, int decimation, float gain)
+      : decimation_(decimation), gain_(gain) {
+    for (int i = 0; i < 5120; ++i) table_[i] = static_cast<float>(std::sin(i * 2.0 * M_PI / 4096));
+    const double cycles = static_cast<double>(frequency) / static_cast<double>(sample_rate);
+    increment_ = static_cast<uint32_t>((cycles - std::floor(cycles)) * 4294967296.0);
+  }
+
+  void Process(const std::vector<float>& input, std::vector<float>* output) {
+    for (const float x : input) {
+      const uint32_t index = phase_ >> 20;
+      cosine_sum_ += table_[index + 1024] * x;
+      sine_sum_ += x * table_[index];
+      phase_ += increment_;
+      if (++count_ < decimation_) continue;
+      i1_ += (cosine_sum_ - i1_) * gain_;
+      q1_ += (sine_sum_ - q1_) * gain_;
+      i2_ += (i1_ - i2_) * gain_;
+      q2_ += (q1_ - q2_) * gain_;
+      output->push_back(i2_ * i2_ + q2_ * q2_);
+      cosine_sum_ = sine_sum_ = 0.0f;
+      count_ = 0;
+    }
+  }
+
+ private:
+  float table_[5120];
+  const int decimation_;
+  const float gain_;
+  uint32_t increment_ = 0;
+  uint32_t phase_ = 1u << 19;
+  int count_ = 0;
+  float cosine_sum_ = 0.0f, sine_sum_ = 0.0f;
+  float i1_ = 0.0f, q1_ = 0.0f, i2_ = 0.0f, q2_ = 0.0f;
+};
+
+std::vector<uint32_t> Bits(const std::vector<float>& values) {
+  std::vector<uint32_t> bits(values.size());
+  if (!values.empty()) std::memcpy(bits.data(), values.data(), values.size() * sizeof(float));
+  return bits;
+}
+
+// Every bank size from one filter to more than one pass of the widest kernel,
+// on random microphone-range input cut into random blocks: each filter's
+// strengths through ProcessAll and through Process equal the plain
+// reference's bit for bit (sums, low-pass and square in the same order).
+TEST(ToneStrengthFilterTest, ProcessAllAndProcessEqualThePlainFilterBitForBit) {
+  std::mt19937 random(14);
+  std::uniform_real_distribution<float> sample(-32768.0f, 32767.0f);
+  std::vector<float> input(20000);
+  for (float& x : input) x = sample(random);
+  for (int count = 1; count <= 13; ++count) {
+    const int decimation = count % 4 == 3 ? 7 : 16;
+    std::vector<ToneStrengthFilter> bank, alone;
+    std::vector<ReferenceFilter> references;
+    for (int i = 0; i < count; ++i) {
+      // Tones across the band, the default decoder's bandwidth.
+      const float frequency = 740.0f * std::pow(1.1487f, static_cast<float>(i)) + 3.7f * count;
+      bank.emplace_back(44100, frequency, 11.863858f, decimation);
+      alone.emplace_back(44100, frequency, 11.863858f, decimation);
+      references.emplace_back(44100, frequency, decimation, bank.back().gain());
+    }
+    std::vector<std::vector<float>> outputs(count), collected(count), each(count), expected(count);
+    std::uniform_int_distribution<int> length(0, 700);
+    for (size_t start = 0; start < input.size();) {
+      const size_t end = std::min(input.size(), start + length(random));
+      const std::vector<float> block(input.begin() + start, input.begin() + end);
+      ToneStrengthFilter::ProcessAll(bank.data(), count, block, outputs.data());
+      for (int i = 0; i < count; ++i) {
+        collected[i].insert(collected[i].end(), outputs[i].begin(), outputs[i].end());
+        std::vector<float> one;
+        alone[i].Process(block, &one);
+        each[i].insert(each[i].end(), one.begin(), one.end());
+        references[i].Process(block, &expected[i]);
+      }
+      start = end;
+    }
+    for (int i = 0; i < count; ++i) {
+      ASSERT_EQ(expected[i].size(), input.size() / decimation);
+      EXPECT_EQ(Bits(collected[i]), Bits(expected[i])) << count << " filters, filter " << i;
+      EXPECT_EQ(Bits(each[i]), Bits(expected[i])) << count << " filters, filter " << i;
     }
   }
 }
